@@ -210,6 +210,20 @@ TEST(RunLoopTest, RemovedSourceNoLongerFiresAndItsModeFinishes) {
     EXPECT_EQ(calls, 0);
 }
 
+TEST(RunLoopTest, RemovingTheLastSourceFromAnotherThreadFinishesAnEndlessRun) {
+    auto loop = RunLoop::current();
+    Pipe idle;
+    const auto id = loop->addSource(idle.readEnd, "Drying", [] {});
+    Semaphore running;
+    loop->performBlock("Drying", [&] { running.signal(); });
+    std::thread remover([&] {
+        running.waitFor(kGenerousSeconds);
+        loop->removeSource(id);
+    });
+    EXPECT_EQ(loop->runInMode("Drying", RunLoop::kInfinite, false), RunResult::Finished);
+    remover.join();
+}
+
 TEST(RunLoopTest, SourceMayRemoveItselfFromItsCallback) {
     auto loop = RunLoop::current();
     Pipe pipe;

@@ -225,6 +225,7 @@ TEST(SimulatedHIDDeviceTest, RemovalDeliversWaitingReportsThenCallsTheHandlerOnc
     uint8_t buffer[8];
     size_t length = sizeof buffer;
     EXPECT_EQ(fixture.device->getReport(HIDReportType::Feature, 0x10, buffer, length), HIDResult::NoDevice);
+    EXPECT_EQ(fixture.device->open(0), HIDResult::NoDevice);
     // A removed device cannot be scheduled again.
     fixture.device->scheduleWithRunLoop(*fixture.loop, kMode);
     EXPECT_EQ(fixture.loop->runInMode(kMode, kGenerousSeconds, false), RunResult::Finished);

@@ -1,0 +1,87 @@
+#pragma once
+// SimulatedHIDDevice: a device handle whose input reports are written by a test or tool, from any
+// thread, and delivered on the run loop like a real device's. Feature reports, per-report failures
+// and device properties are set up by the caller; calls into the handle are counted for tests.
+//
+// Written reports wait in an unbounded queue signalled through a semaphore-mode eventfd, so that
+// each write is exactly one report (zero-length ones included) and a writer never blocks.
+
+#include <deque>
+#include <map>
+#include <vector>
+
+#include "platform/HIDDeviceBase.h"
+
+namespace TolkaTouch {
+
+class SimulatedHIDDevice : public HIDDeviceBase {
+public:
+    // Null only when no eventfd can be made.
+    static std::shared_ptr<SimulatedHIDDevice> create(PropertyValue::Dictionary properties = {});
+    ~SimulatedHIDDevice() override;
+
+    // Queues one input report; false once the device was removed.
+    bool writeInputReport(std::vector<uint8_t> bytes);
+    bool writeInputReport(const uint8_t* bytes, size_t length);
+    // Ends the report stream: reports already written are still delivered, then the device is
+    // removed (its sources go and the removal handler runs on the run loop's thread).
+    void simulateRemoval();
+    size_t pendingInputReportCount() const;
+
+    // Answer to getReport(Feature, id, ...): these bytes (numbered reports start with their ID).
+    void setFeatureReport(uint32_t reportID, std::vector<uint8_t> bytes);
+    // getReport of `reportID` (any type) answers `result`; Success clears the failure.
+    void failReport(uint32_t reportID, uint32_t result);
+    // A device property (what getProperty answers when the handle's own dictionary has no entry).
+    void setDeviceProperty(std::string key, PropertyValue value);
+    // Whether input reports carry a leading report ID byte (default true).
+    void setUsesReportIDs(bool numbered) { _numbered.store(numbered); }
+    // Time stamps of delivered reports; Host::absoluteTime() unless replaced.
+    void setTimestampSource(std::function<uint64_t()> now);
+
+    uint32_t open(uint32_t options) override;
+    uint32_t close(uint32_t options) override;
+    uint32_t getReport(HIDReportType type, uint32_t reportID, uint8_t* buffer, size_t& length) override;
+    void registerInputReportCallback(uint8_t* buffer, size_t length, InputReportCallback callback,
+                                     void* context) override;
+    void scheduleWithRunLoop(RunLoop& runLoop, const std::string& mode) override;
+    void unscheduleFromRunLoop(RunLoop& runLoop, const std::string& mode) override;
+
+    struct Counts {
+        int open = 0;
+        int close = 0;
+        int registerCallback = 0;    // with a callback
+        int unregisterCallback = 0;  // with a null callback
+        int schedule = 0;
+        int unschedule = 0;
+        int getReport = 0;
+        uint32_t lastOpenOptions = 0;
+        uint32_t lastCloseOptions = 0;
+        bool operator==(const Counts&) const = default;
+    };
+    Counts counts() const;
+
+protected:
+    ReadOutcome readInputReport(uint8_t* buffer, size_t capacity) override;
+    int inputFileDescriptor() const override { return _eventFd; }
+    PropertyValue deviceProperty(std::string_view key) const override;
+    bool reportsAreNumbered() const override { return _numbered.load(); }
+    uint64_t readTimestamp() const override;
+
+private:
+    explicit SimulatedHIDDevice(int eventFd, PropertyValue::Dictionary properties);
+
+    const int _eventFd;
+    std::atomic<bool> _numbered{true};
+
+    mutable std::mutex _mutex;
+    std::deque<std::vector<uint8_t>> _reports;
+    bool _ended = false;
+    std::map<uint32_t, std::vector<uint8_t>> _featureReports;
+    std::map<uint32_t, uint32_t> _failures;
+    PropertyValue::Dictionary _deviceProperties;
+    std::function<uint64_t()> _now;
+    Counts _counts;
+};
+
+}  // namespace TolkaTouch
