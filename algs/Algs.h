@@ -1,28 +1,49 @@
 #pragma once
 // Algs: the touch recognizer's driver. Turns one image frame into at most one gesture event and
 // keeps the recognizer's settings and counters, reachable by state key.
-// (Interface agreed with the pipeline; the touch-recognition work fills in the members.)
+// Owned by value by the pipeline, which serialises every call.
 
+#include <array>
 #include <cstdint>
 #include <string>
+#include <vector>
 
+#include "algs/EventStats.h"
+#include "algs/HandStats.h"
+#include "algs/Pixel.h"
+#include "algs/VirtualImage.h"
+#include "algs/VirtualPixel.h"
 #include "pipeline/common/Reports.h"
 #include "platform/HIDEvent.h"
+#include "platform/Log.h"
 #include "platform/PropertyValue.h"
 
 namespace TolkaTouch {
 
 class Algs {
 public:
+    // Gains of pixels A..O. They are uneven by design (the sensing pixels differ in size and
+    // coupling) and must be kept exactly.
+    static constexpr std::array<float, kPixelCount> pixelGains{
+        1.9219f, 1.8833f, 1.9281f, 1.8837f, 1.9163f, 1.8105f, 1.0081f, 1.0f,
+        1.4851f, 1.5033f, 2.4154f, 1.5378f, 1.5431f, 1.04f,   1.0493f,
+    };
+
     Algs();
 
     EventList handleImage(const InputReport::Image& image);
+    // A firmware reset: an all-zero frame (number 0, time 0) ends any touch by the ordinary rules.
     EventList handleReset();
     void processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint32_t timeMs, EventList& out);
+    // Closes a touch's statistics: the pixels' per-touch fields and the hand's score record.
     void Reset();
 
     PropertyValue getState(const std::string& key) const;
     void setState(const std::string& key, PropertyValue value);
+
+    // One line each of the state a frame left, for people tuning the recognizer.
+    std::string touchStateDescription(const int16_t* readings, uint32_t timeMs) const;
+    std::string virtualStateDescription(const int16_t* readings, uint32_t timeMs) const;
 
     static HIDEventRef createMayBeginEvent(PixelRegion region);
     static HIDEventRef createHoldStartEvent(PixelRegion region);
@@ -30,6 +51,18 @@ public:
     static HIDEventRef createHoldEndEvent(PixelRegion region);
     static HIDEventRef createTapEvent(PixelRegion region);
     static HIDEventRef createCancelEvent();
+
+    // The recognizer's state, open for inspection.
+    Log log;
+    std::vector<Pixel> pixels;                // A..O
+    VirtualImage virtualImage;                // the groups, their sums and factors
+    std::vector<VirtualPixel> virtualPixels;  // one per group, in group order
+    HandStats handStats;                      // also holds the tuning settings
+    EventStats eventStats;
+    int16_t lastEventPhase = 0;  // phase of the last event emitted
+
+private:
+    std::string touchPhaseDescription(uint32_t timeMs) const;
 };
 
 }  // namespace TolkaTouch

@@ -1,0 +1,306 @@
+#include "algs/HandStats.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+namespace TolkaTouch {
+
+namespace {
+
+constexpr float kE2 = 7.389056f;
+
+size_t slot(PixelRegion region) { return static_cast<size_t>(region); }
+
+// Order key of the region sort: largest maxNormalizedAboveNoise first. A key that is not a number
+// (only with a divisor that is not one) sorts last, so the order stays a strict weak one.
+float sortKey(const Pixel& pixel) {
+    const float key = pixel.maxNormalizedAboveNoise;
+    return std::isnan(key) ? -std::numeric_limits<float>::infinity() : key;
+}
+
+}  // namespace
+
+std::vector<Pixel> sortByMaxNormalizedAboveNoise(std::vector<Pixel> pixels) {
+    std::stable_sort(pixels.begin(), pixels.end(),
+                     [](const Pixel& a, const Pixel& b) { return sortKey(a) > sortKey(b); });
+    return pixels;
+}
+
+HandStats::HandStats() = default;
+
+void HandStats::SetDecayParameters() { decayBase = kE2; }
+
+void HandStats::Reset() {
+    touchScore = 0.0f;
+    peakStrength = 0.0f;
+    maxOnStrength = 0.0f;
+    maxOnIndex = 0;
+}
+
+void HandStats::updateHandState(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+                                unsigned int time) {
+    // 1. Scan the real pixels, then the virtual ones: the strongest on element since the last
+    // Reset, whether anything is on or above noise, and this frame's strongest element.
+    bool someOn = false;
+    bool someAboveNoise = false;
+    float strongestStrength = 0.0f;
+    int32_t strongestIndex = 0;
+    const auto scan = [&](const Pixel& pixel) {
+        const float s = std::max(pixel.normalized, 0.0f);
+        if (pixel.isOn) {
+            if (s > maxOnStrength) {
+                maxOnIndex = pixel.index;
+                maxOnStrength = s;
+            }
+            someOn = true;
+        }
+        if (pixel.aboveNoise) someAboveNoise = true;
+        if (s > strongestStrength) {
+            strongestStrength = s;
+            strongestIndex = pixel.index;
+        }
+    };
+    for (const Pixel& pixel : pixels) scan(pixel);
+    for (const VirtualPixel& pixel : virtualPixels) scan(pixel);
+
+    // 2.
+    wasTouching = touching;
+    touching = someOn;
+    wasAboveNoise = isAboveNoise;
+    isAboveNoise = someAboveNoise;
+
+    // 3. The region: followed by its strength while holding (last frame's verdict), chosen afresh
+    // otherwise.
+    if (touching) {
+        activeRegion = holding ? changeActiveRegion(pixels, strongestIndex)
+                               : updateActiveRegion(pixels, virtualPixels, time);
+    }
+
+    // 4. Edge times.
+    if (isAboveNoise && !wasAboveNoise) noiseStartTime = time;
+    if (!isAboveNoise && wasAboveNoise) noiseEndTime = time;
+    if (touching && !wasTouching) touchStartTime = time;
+    if (!touching && wasTouching) touchEndTime = time;
+
+    // 5.
+    updateTouchScore(pixels, virtualPixels, time);
+    updateTapRejection(pixels, virtualPixels);
+
+    // 6. Last frame's flags; the exceed flag from before this frame's decision decides the tap.
+    wasHolding = holding;
+    const bool holdTimeWasExceeded = holdTimeExceeded;
+    wasHoldTimeExceeded = holdTimeExceeded;
+    wasHoldSuppressed = isHoldSuppressed;
+
+    // 7. Hold decision.
+    const uint32_t elapsed = time - touchStartTime;
+    if (EnableHoldSuppression) {
+        if (touching && elapsed > HoldTimeoutMilliseconds) {
+            holdTimeExceeded = true;
+            holding = touchScore >= holdScoreThreshold || wasHolding;
+            isHoldSuppressed = touchScore < holdScoreThreshold && !wasHolding;
+        } else {
+            holding = false;
+            isHoldSuppressed = false;
+            holdTimeExceeded = false;
+        }
+    } else {
+        // The exceed flag is not kept up here, so every touch end counts as a tap, also after a hold.
+        holding = touching && elapsed > HoldTimeoutMilliseconds;
+    }
+    const bool holdEnded = wasHolding && !holding;
+
+    // 8. Tap decision.
+    const bool touchEnded = !touching && wasTouching;
+    if (EnableTapSuppression) {
+        if (touchEnded) {
+            if (holdTimeWasExceeded) {
+                tapCandidate = false;
+                tapDetected = false;
+                isTapRejected = false;
+            } else {
+                tapCandidate = true;
+                tapDetected = !isTapRejected;
+            }
+        } else {
+            tapCandidate = false;
+            tapDetected = false;
+            isTapRejected = false;
+        }
+    } else if (touching) {
+        tapCandidate = false;
+        tapDetected = false;
+    } else {
+        tapCandidate = wasTouching && !holdTimeWasExceeded;
+        tapDetected = tapCandidate;
+    }
+
+    // 9. A tap or the end of a hold is the last event, for the region-keeping rule.
+    if (tapDetected || holdEnded) {
+        lastEventTime = time;
+        eventRegion = activeRegion;
+    }
+}
+
+void HandStats::updateTouchScore(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+                                 unsigned int time) {
+    // 1.
+    svm.updateSVMScore(pixels, virtualPixels, ActivationThreshold);
+    // 2. Noise that returns right after ending keeps part of the score.
+    if (isAboveNoise && !wasAboveNoise && touchScore != 0.0f) decayTouchScore(time);
+    // 3.
+    touchScore += svm.score;
+    // 4.
+    if (touchScore > scoreLimit) {
+        touchScore = scoreLimit;
+    } else if (touchScore < -scoreLimit) {
+        touchScore = -scoreLimit;
+    }
+}
+
+void HandStats::decayTouchScore(unsigned int time) {
+    // g is in milliseconds: the score survives only when noise returns within about 2 ms, and
+    // time equal to noiseEndTime wraps to the largest g, which clears it.
+    const uint32_t gap = time - noiseEndTime - 1u;
+    const double g = static_cast<double>(gap);
+    const double f = std::max((1.0 - std::exp(g) / (decayBase - 1)) * std::fabs(touchScore), 0.0);
+    touchScore = std::copysign(static_cast<float>(f), touchScore);
+}
+
+float HandStats::updateTimeBiasFactor(unsigned int time) {
+    const float d = static_cast<float>(static_cast<double>(time - lastEventTime) * 0.001);
+    return fuzzifyAndClip(d, 0.3f, 1.0f, 0.65f, 1.0f);
+}
+
+float HandStats::fuzzify(float x, float x0, float x1, float y0, float y1) {
+    const float t = (x - x0) / (x1 - x0);
+    return std::fma(1.0f - t, y0, t * y1);
+}
+
+float HandStats::fuzzifyAndClip(float x, float x0, float x1, float y0, float y1) {
+    if (x <= x0) return y0;
+    if (x >= x1) return y1;
+    return fuzzify(x, x0, x1, y0, y1);
+}
+
+void HandStats::updateRegionMax(const std::vector<Pixel>& pixels) {
+    std::fill(regionMax.begin(), regionMax.end(), 0.0f);
+    for (const Pixel& pixel : pixels) {
+        const PixelRegion r = pixelRegionOfIndex(pixel.index);
+        const float excess = static_cast<float>(pixel.value) - 75.0f;
+        if (excess > 0.0f && r != PixelRegion::None) regionMax[slot(r)] = std::max(regionMax[slot(r)], excess);
+    }
+}
+
+PixelRegion HandStats::updateActiveRegion(const std::vector<Pixel>& pixels,
+                                          const std::vector<VirtualPixel>& virtualPixels, unsigned int time) {
+    // 1. The region of the strongest on element since the last Reset.
+    PixelRegion r = pixelRegionOfIndex(maxOnIndex);
+
+    // 2. The two pixels strongest above noise over this touch; equal keys keep index order.
+    const std::vector<Pixel> sorted = sortByMaxNormalizedAboveNoise(pixels);
+    const Pixel& first = sorted.at(0);
+    const Pixel& second = sorted.at(1);
+
+    // 3. Soon after a tap or hold end the last event's region is favoured.
+    const float b = updateTimeBiasFactor(time);
+    const float noiseLevel = 75.0f / ActivationThreshold;
+
+    // 4. Keep the last event's region when the touch straddles it.
+    if (r != eventRegion && second.maxNormalizedAboveNoise > noiseLevel && first.getPixelRegion() == r &&
+        second.maxNormalizedAboveNoise > first.maxNormalizedAboveNoise * b &&
+        second.getPixelRegion() == eventRegion) {
+        r = eventRegion;
+    }
+
+    // 5. "K" lies between the zones, so a touch centred on it is settled by its neighbours: towards
+    // "M" through the group "KLM", towards "I" through the group "IJK".
+    constexpr int32_t kPixelK = 10;
+    constexpr int32_t kPixelM = 12;
+    constexpr int32_t kPixelI = 8;
+    constexpr size_t kGroupIJK = 18;
+    constexpr size_t kGroupKLM = 19;
+    if (maxOnIndex == kPixelK && second.maxNormalizedAboveNoise > noiseLevel && first.index == kPixelK) {
+        const float centre = pixels.at(kPixelK).maxNormalizedAboveNoise;
+        if (second.index == kPixelM) {
+            const float f = eventRegion == PixelRegion::VolumeDown ? std::min(b, 0.7f) : 0.7f;
+            if (virtualPixels.at(kGroupKLM).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeDown;
+        } else if (second.index == kPixelI) {
+            const float f = eventRegion == PixelRegion::VolumeUp ? std::min(b, 0.7f) : 0.7f;
+            if (virtualPixels.at(kGroupIJK).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeUp;
+        }
+    }
+
+    // 6.
+    updateRegionMax(pixels);
+    return r;
+}
+
+PixelRegion HandStats::changeActiveRegion(const std::vector<Pixel>& pixels, int index) {
+    // 1.
+    previousActiveRegion = activeRegion;
+    const PixelRegion c = activeRegion;
+    const PixelRegion n = pixelRegionOfIndex(index);
+
+    // 2.
+    if (n == c) return c;
+    if (c == PixelRegion::None || n == PixelRegion::None) return n;
+
+    // 3. Last frame's maximum of the current region and ratio of the new one to it.
+    const float m = regionMax[slot(c)];
+    const float q = m > 0.0f ? regionMax[slot(n)] / m : 0.0f;
+
+    // 4.
+    updateRegionMax(pixels);
+    const float mNow = regionMax[slot(c)];
+    if (!(mNow > 0.0f)) return n;
+
+    // 5. The more the current region has fallen, the more the new one must have grown.
+    float k = 1.3f;
+    if (m > 0.0f) {
+        const float drop = std::max(m - mNow, 0.0f) / m;
+        k = fuzzifyAndClip(drop, 0.2f, 0.5f, 1.3f, 5.0f);
+    }
+    regionSwitchFactor = k;
+
+    // 6.
+    return regionMax[slot(n)] / mNow >= k * q ? n : c;
+}
+
+void HandStats::updateTapRejection(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels) {
+    // 1.
+    peakStrength = maxOnStrength * ActivationThreshold;
+
+    // 2.
+    const uint32_t span = std::min(touchEndTime - noiseStartTime, touchEndTime - lastEventTime);
+    const uint32_t duration = touchEndTime - touchStartTime;
+
+    // 3.
+    strengthRate = 0.0f;
+    strengthPerDuration = 0.0f;
+    durationRatio = 0.0f;
+    tapScore = 0.0f;
+    activePixelCount = 0;
+    if (span != 0) {
+        strengthRate = peakStrength / static_cast<float>(span) - 0.51f;
+        durationRatio = static_cast<float>(duration) / static_cast<float>(span) - 0.25f;
+    }
+    if (duration != 0) strengthPerDuration = peakStrength / static_cast<float>(duration) - 0.65f;
+
+    // 4. Elements above noise that were never on during the touch.
+    int32_t nonActive = 0;
+    for (const Pixel& pixel : pixels) nonActive += pixel.wasAboveNoise && !pixel.wasOn;
+    for (const VirtualPixel& pixel : virtualPixels) nonActive += pixel.wasAboveNoise && !pixel.wasOn;
+
+    // 5., 6.
+    activePixelCount = 21 - nonActive;
+    tapScore = 0.1886f * static_cast<float>(activePixelCount) + 0.2772f * strengthRate + 2.7205f * durationRatio -
+               2.4116f;
+
+    // 7. Deliberately unequal comparisons: <= for strengthPerDuration, < for the rest.
+    isTapRejected = strengthPerDuration <= 0.0f || strengthRate < 0.0f || nonActive > 21 || durationRatio < 0.0f ||
+                    tapScore < 0.0f;
+}
+
+}  // namespace TolkaTouch

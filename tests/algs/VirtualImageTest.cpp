@@ -1,0 +1,117 @@
+#include "algs/VirtualImage.h"
+
+#include <gtest/gtest.h>
+
+#include <stdexcept>
+
+namespace TolkaTouch {
+namespace {
+
+std::vector<Pixel> realPixels() {
+    std::vector<Pixel> pixels;
+    for (int i = 0; i < 15; ++i) pixels.emplace_back(i, 1.0f);
+    return pixels;
+}
+
+// Sets the scaled values of the pixels named by letters (gain 1, so value = raw).
+void setValues(std::vector<Pixel>& pixels, std::initializer_list<std::pair<char, int>> values) {
+    for (Pixel& pixel : pixels) pixel.updatePixelState(0, 200.0f);
+    for (auto [letter, value] : values) pixels[static_cast<size_t>(letter - 'A')].updatePixelState(value, 200.0f);
+}
+
+TEST(VirtualImageTest, HasTheTwentyThreeGroupsInOrderWithTheirFactors) {
+    const VirtualImage image;
+    const std::vector<std::string> groups = {"ABE", "ABF", "ADEF", "AEGJ", "BCEF", "BFHJ", "CDE", "CDF",
+                                             "CELN", "DFLO", "EFK", "EJK", "EKL", "FJK", "FKL", "GHI",
+                                             "GIJ", "HIJ", "IJK", "KLM", "LMN", "LMO", "MNO"};
+    const std::vector<float> factors = {0.6667f, 0.4444f, 0.6667f, 0.5714f, 0.6667f, 0.5714f, 0.6667f, 0.4651f,
+                                        0.6667f, 0.6667f, 0.4f,    0.4f,    0.4f,    0.4f,    0.4f,    0.5714f,
+                                        0.4f,    0.4f,    0.4f,    0.4f,    0.4444f, 0.5714f, 0.6667f};
+    EXPECT_EQ(image.groups, groups);
+    EXPECT_EQ(image.normalizationFactors, factors);
+    EXPECT_EQ(image.values, std::vector<int32_t>(23, 0));
+}
+
+TEST(VirtualImageTest, StrongestStartsAsTheIndexOfEachGroupsFirstLetter) {
+    const VirtualImage image;
+    const std::vector<int32_t> expected = {0, 0, 0, 0, 1, 1, 2, 2, 2, 3, 4, 4, 4, 5, 5, 6, 6, 7, 8, 10, 11, 11, 12};
+    EXPECT_EQ(image.strongest, expected);
+}
+
+TEST(VirtualImageTest, GroupSumsAddOnlyMembersAboveNoise) {
+    VirtualImage image;
+    auto pixels = realPixels();
+    setValues(pixels, {{'A', 100}, {'B', 75}, {'E', 76}});
+    image.updateValues(pixels);
+    EXPECT_EQ(image.values[0], 176);  // ABE: B at 75 adds nothing
+    EXPECT_EQ(image.values[1], 100);  // ABF
+    EXPECT_EQ(image.values[2], 176);  // ADEF
+    EXPECT_EQ(image.values[10], 76);  // EFK
+    EXPECT_EQ(image.values[22], 0);   // MNO
+}
+
+TEST(VirtualImageTest, GroupWithAllMembersAtOrBelowNoiseYieldsZeroAndKeepsItsStrongestIndex) {
+    VirtualImage image;
+    auto pixels = realPixels();
+    setValues(pixels, {{'L', 100}, {'M', 300}});
+    image.updateValues(pixels);
+    ASSERT_EQ(image.strongest[19], 12);  // KLM: M
+
+    setValues(pixels, {{'K', 75}, {'L', 75}, {'M', 10}});
+    image.updateValues(pixels);
+    EXPECT_EQ(image.values[19], 0);
+    EXPECT_EQ(image.strongest[19], 12);
+}
+
+TEST(VirtualImageTest, ValuesAreRecomputedEachFrame) {
+    VirtualImage image;
+    auto pixels = realPixels();
+    setValues(pixels, {{'G', 500}});
+    image.updateValues(pixels);
+    ASSERT_EQ(image.values[15], 500);
+    setValues(pixels, {});
+    image.updateValues(pixels);
+    EXPECT_EQ(image.values[15], 0);
+}
+
+TEST(VirtualImageTest, OnEqualValuesThePixelAlreadyRecordedWins) {
+    VirtualImage image;
+    auto pixels = realPixels();
+    setValues(pixels, {{'H', 200}, {'I', 300}});
+    image.updateValues(pixels);
+    ASSERT_EQ(image.strongest[15], 8);  // GHI: I
+
+    setValues(pixels, {{'G', 300}, {'H', 300}, {'I', 300}});
+    image.updateValues(pixels);
+    EXPECT_EQ(image.strongest[15], 8);
+}
+
+TEST(VirtualImageTest, AmongNewcomersWithEqualValuesTheEarlierLetterWins) {
+    VirtualImage image;
+    auto pixels = realPixels();
+    setValues(pixels, {{'H', 300}, {'I', 300}});
+    image.updateValues(pixels);
+    EXPECT_EQ(image.strongest[15], 7);  // GHI: G reads 0, H beats it first, I only equals H
+}
+
+TEST(VirtualImageTest, StrongestComparesAgainstThisFramesValueOfTheRecordedPixel) {
+    VirtualImage image;
+    auto pixels = realPixels();
+    setValues(pixels, {{'C', 900}});
+    image.updateValues(pixels);
+    ASSERT_EQ(image.strongest[6], 2);  // CDE: C
+
+    setValues(pixels, {{'C', 100}, {'D', 200}});
+    image.updateValues(pixels);
+    EXPECT_EQ(image.strongest[6], 3);
+}
+
+TEST(VirtualImageTest, TooFewPixelsRaiseTheStandardOutOfRangeFailure) {
+    VirtualImage image;
+    std::vector<Pixel> pixels;
+    for (int i = 0; i < 3; ++i) pixels.emplace_back(i, 1.0f);
+    EXPECT_THROW(image.updateValues(pixels), std::out_of_range);
+}
+
+}  // namespace
+}  // namespace TolkaTouch
