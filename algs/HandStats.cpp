@@ -22,8 +22,10 @@ float sortKey(const Pixel& pixel) {
 }  // namespace
 
 std::vector<Pixel> sortByMaxNormalizedAboveNoise(std::vector<Pixel> pixels) {
-    std::stable_sort(pixels.begin(), pixels.end(),
-                     [](const Pixel& a, const Pixel& b) { return sortKey(a) > sortKey(b); });
+    std::sort(pixels.begin(), pixels.end(), [](const Pixel& a, const Pixel& b) {
+        if (sortKey(a) != sortKey(b)) return sortKey(a) > sortKey(b);
+        return a.index < b.index;
+    });
     return pixels;
 }
 

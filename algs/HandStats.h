@@ -13,7 +13,7 @@
 
 namespace TolkaTouch {
 
-// The pixels largest maxNormalizedAboveNoise first; equal keys keep their order (ascending index).
+// The pixels largest maxNormalizedAboveNoise first; equal keys in ascending index order.
 std::vector<Pixel> sortByMaxNormalizedAboveNoise(std::vector<Pixel> pixels);
 
 class HandStats {

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <stdexcept>
 
 namespace TolkaTouch {
 
@@ -20,6 +21,20 @@ constexpr std::array<GroupDefinition, 23> kGroups{{
     {"GHI", 0.5714f},  {"GIJ", 0.4f},     {"HIJ", 0.4f},     {"IJK", 0.4f},     {"KLM", 0.4f},
     {"LMN", 0.4444f},  {"LMO", 0.5714f},  {"MNO", 0.6667f},
 }};
+
+// Element i with a range test: an index outside the vector raises the standard out-of-range
+// failure with the message "vector".
+template <typename T>
+T& checkedAt(std::vector<T>& vector, size_t i) {
+    if (i >= vector.size()) throw std::out_of_range("vector");
+    return vector[i];
+}
+
+template <typename T>
+const T& checkedAt(const std::vector<T>& vector, size_t i) {
+    if (i >= vector.size()) throw std::out_of_range("vector");
+    return vector[i];
+}
 
 }  // namespace
 
@@ -45,10 +60,13 @@ void VirtualImage::updateValues(const std::vector<Pixel>& pixels) {
     for (size_t g = 0; g < groups.size(); ++g) {
         for (const char letter : groups[g]) {
             const size_t i = static_cast<size_t>(letter - 'A');
-            const int32_t v = pixels.at(i).value;
+            const int32_t v = checkedAt(pixels, i).value;
             if (v >= Pixel::kNoiseLevel + 1) {
-                values.at(g) += v;
-                if (v > pixels.at(static_cast<size_t>(strongest.at(g))).value) strongest.at(g) = static_cast<int32_t>(i);
+                checkedAt(values, g) += v;
+                int32_t& strongestIndex = checkedAt(strongest, g);
+                if (v > checkedAt(pixels, static_cast<size_t>(strongestIndex)).value) {
+                    strongestIndex = static_cast<int32_t>(i);
+                }
             }
         }
     }

@@ -99,6 +99,21 @@ TEST_F(AlgsTest, CreatedEventsCarryMaskPhaseAndRegion) {
     check(Algs::createCancelEvent(), 0, 8, 0.0);
 }
 
+TEST_F(AlgsTest, CreatedEventsLeaveEveryOtherFieldAtZero) {
+    for (const HIDEventRef& e :
+         {Algs::createMayBeginEvent(PixelRegion::VolumeUp), Algs::createHoldStartEvent(PixelRegion::PlayPause),
+          Algs::createHoldChangeEvent(PixelRegion::VolumeDown), Algs::createHoldEndEvent(PixelRegion::VolumeUp),
+          Algs::createTapEvent(PixelRegion::VolumeDown), Algs::createCancelEvent()}) {
+        EXPECT_EQ(e->transducerIndex, 0u);
+        EXPECT_EQ(e->identity, 0u);
+        EXPECT_EQ(e->buttonMask, 0u);
+        EXPECT_EQ(e->tipPressure, 0.0);
+        EXPECT_EQ(e->barrelPressure, 0.0);
+        EXPECT_EQ(e->options, 0u);
+        EXPECT_EQ(e->integerValue(kDigitizerFrameNumberField), 0);
+    }
+}
+
 TEST_F(AlgsTest, TapEventPhaseReadsBackAsZero) { EXPECT_EQ(Algs::createTapEvent(PixelRegion::PlayPause)->phase, 0u); }
 
 TEST_F(AlgsTest, CancelEventHasYZeroWhateverTheRegion) { EXPECT_EQ(Algs::createCancelEvent()->y, 0.0); }

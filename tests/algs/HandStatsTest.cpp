@@ -362,6 +362,36 @@ TEST(HandStatsTest, SpanIsTheShorterOfTheTimesSinceNoiseStartAndSinceTheLastEven
     EXPECT_EQ(hand.durationRatio, 100.0f / 50.0f - 0.25f);
 }
 
+TEST(HandStatsTest, StrengthRateAndDurationRatioOfExactlyZeroLeaveTheTapStanding) {
+    HandStats hand;
+    hand.ActivationThreshold = 1.0f;
+    hand.maxOnStrength = 51.0f;  // peak 51 over a 100 ms span: 0.51 per ms
+    hand.noiseStartTime = 1000;
+    hand.touchStartTime = 1075;
+    hand.touchEndTime = 1100;    // 25 ms of 100: a quarter
+    hand.updateTapRejection(kIdle.pixels, kIdle.virtualPixels);
+    EXPECT_EQ(hand.strengthRate, 0.0f);
+    EXPECT_EQ(hand.durationRatio, 0.0f);
+    EXPECT_GT(hand.strengthPerDuration, 0.0f);
+    EXPECT_GT(hand.tapScore, 0.0f);
+    EXPECT_FALSE(hand.isTapRejected);
+}
+
+TEST(HandStatsTest, StrengthPerDurationOfExactlyZeroRejectsTheTap) {
+    HandStats hand;
+    hand.ActivationThreshold = 1.0f;
+    hand.maxOnStrength = 13.0f;  // peak 13 over 20 ms: 0.65 per ms
+    hand.noiseStartTime = 1000;
+    hand.touchStartTime = 1005;
+    hand.touchEndTime = 1025;
+    hand.updateTapRejection(kIdle.pixels, kIdle.virtualPixels);
+    EXPECT_EQ(hand.strengthPerDuration, 0.0f);
+    EXPECT_GT(hand.strengthRate, 0.0f);
+    EXPECT_GT(hand.durationRatio, 0.0f);
+    EXPECT_GT(hand.tapScore, 0.0f);
+    EXPECT_TRUE(hand.isTapRejected);
+}
+
 // A 100 ms tap of strength `strength` with `count` elements above noise that were never on.
 HandStats tapWithNonActivePixels(int count, float strength) {
     HandStats hand;
@@ -418,6 +448,77 @@ TEST(HandStatsTest, SortingPutsTheLargestKeyFirstAndKeepsEqualKeysInIndexOrder) 
     EXPECT_EQ(sorted[1].index, 2);
     EXPECT_EQ(sorted[2].index, 9);
     EXPECT_EQ(sorted[3].index, 0);
+}
+
+TEST(HandStatsTest, SortingOrdersEqualKeysByAscendingIndexWhateverTheirPlaceInTheList) {
+    std::vector<Pixel> pixels;
+    for (int i = 14; i >= 0; --i) pixels.emplace_back(i, 1.0f);  // O first, A last
+    pixels[3].maxNormalizedAboveNoise = 2.0f;                     // "L"
+    pixels[12].maxNormalizedAboveNoise = 2.0f;                    // "C"
+    const std::vector<Pixel> sorted = sortByMaxNormalizedAboveNoise(pixels);
+    EXPECT_EQ(sorted[0].index, 2);
+    EXPECT_EQ(sorted[1].index, 11);
+    for (size_t i = 3; i < 15; ++i) EXPECT_LT(sorted[i - 1].index, sorted[i].index);  // the rest, all at 0
+}
+
+// A touch starting 100 ms after the last event: time bias 0.65.
+HandStats handSoonAfterAnEventIn(PixelRegion eventRegion, int32_t maxOnIndex) {
+    HandStats hand;
+    hand.lastEventTime = 1000;
+    hand.eventRegion = eventRegion;
+    hand.maxOnIndex = maxOnIndex;
+    return hand;
+}
+
+TEST(HandStatsTest, LastEventsRegionIsKeptOnlyWhenTheSecondPixelIsAboveTheBiasedFirst) {
+    HandFrame frame;
+    frame.pixels[2].maxNormalizedAboveNoise = 2.0f;  // "C", region 1, strongest
+    frame.pixels[7].maxNormalizedAboveNoise = 1.3f;  // "H", region 3: exactly 2.0 x 0.65
+    HandStats equal = handSoonAfterAnEventIn(PixelRegion::VolumeUp, 2);
+    EXPECT_EQ(equal.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::PlayPause);
+
+    frame.pixels[7].maxNormalizedAboveNoise = std::nextafter(1.3f, 2.0f);
+    HandStats above = handSoonAfterAnEventIn(PixelRegion::VolumeUp, 2);
+    EXPECT_EQ(above.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::VolumeUp);
+}
+
+TEST(HandStatsTest, TouchCentredOnKGoesTowardsMOnlyWhenKLMIsAboveSevenTenthsOfK) {
+    HandFrame frame;
+    frame.pixels[10].maxNormalizedAboveNoise = 2.0f;          // "K"
+    frame.pixels[12].maxNormalizedAboveNoise = 1.0f;          // "M"
+    frame.virtualPixels[19].maxNormalizedAboveNoise = 1.4f;  // "KLM": exactly 0.7 x 2.0
+    HandStats equal = handSoonAfterAnEventIn(PixelRegion::None, 10);
+    EXPECT_EQ(equal.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::PlayPause);
+
+    frame.virtualPixels[19].maxNormalizedAboveNoise = std::nextafter(1.4f, 2.0f);
+    HandStats above = handSoonAfterAnEventIn(PixelRegion::None, 10);
+    EXPECT_EQ(above.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::VolumeDown);
+}
+
+TEST(HandStatsTest, TouchCentredOnKSoonAfterAnEventInRegionTwoNeedsKLMAboveTheTimeBiasOfK) {
+    HandFrame frame;
+    frame.pixels[10].maxNormalizedAboveNoise = 2.0f;
+    frame.pixels[12].maxNormalizedAboveNoise = 1.0f;
+    frame.virtualPixels[19].maxNormalizedAboveNoise = 1.3f;  // exactly 0.65 x 2.0
+    HandStats equal = handSoonAfterAnEventIn(PixelRegion::VolumeDown, 10);
+    EXPECT_EQ(equal.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::PlayPause);
+
+    frame.virtualPixels[19].maxNormalizedAboveNoise = std::nextafter(1.3f, 2.0f);
+    HandStats above = handSoonAfterAnEventIn(PixelRegion::VolumeDown, 10);
+    EXPECT_EQ(above.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::VolumeDown);
+}
+
+TEST(HandStatsTest, TouchCentredOnKIgnoresASecondPixelAtTheNoiseLevel) {
+    HandFrame frame;
+    frame.pixels[10].maxNormalizedAboveNoise = 2.0f;
+    frame.pixels[8].maxNormalizedAboveNoise = 0.375f;        // "I": exactly 75 / 200
+    frame.virtualPixels[18].maxNormalizedAboveNoise = 2.0f;  // "IJK"
+    HandStats atNoise = handSoonAfterAnEventIn(PixelRegion::None, 10);
+    EXPECT_EQ(atNoise.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::PlayPause);
+
+    frame.pixels[8].maxNormalizedAboveNoise = std::nextafter(0.375f, 1.0f);
+    HandStats aboveNoise = handSoonAfterAnEventIn(PixelRegion::None, 10);
+    EXPECT_EQ(aboveNoise.updateActiveRegion(frame.pixels, frame.virtualPixels, 1100), PixelRegion::VolumeUp);
 }
 
 TEST(HandStatsTest, DuringAHoldWithThePreviousMaximumZeroTheTouchMovesOnceTheCurrentMaximumIsAboveZero) {

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <stdexcept>
+#include <string>
 
 namespace TolkaTouch {
 namespace {
@@ -111,6 +112,39 @@ TEST(VirtualImageTest, TooFewPixelsRaiseTheStandardOutOfRangeFailure) {
     std::vector<Pixel> pixels;
     for (int i = 0; i < 3; ++i) pixels.emplace_back(i, 1.0f);
     EXPECT_THROW(image.updateValues(pixels), std::out_of_range);
+}
+
+// The message a failed range test carries, or "" when nothing was thrown.
+std::string outOfRangeMessage(VirtualImage& image, const std::vector<Pixel>& pixels) {
+    try {
+        image.updateValues(pixels);
+    } catch (const std::out_of_range& failure) {
+        return failure.what();
+    }
+    return "";
+}
+
+TEST(VirtualImageTest, ALetterOutsideThePixelsFailsWithTheMessageVector) {
+    VirtualImage image;
+    std::vector<Pixel> pixels;
+    for (int i = 0; i < 3; ++i) pixels.emplace_back(i, 1.0f);
+    EXPECT_EQ(outOfRangeMessage(image, pixels), "vector");
+}
+
+TEST(VirtualImageTest, AGroupIndexOutsideTheValuesFailsWithTheMessageVector) {
+    VirtualImage image;
+    std::vector<Pixel> pixels = realPixels();
+    setValues(pixels, {{'M', 300}, {'N', 300}, {'O', 300}});
+    image.values.pop_back();  // no room for "MNO"
+    EXPECT_EQ(outOfRangeMessage(image, pixels), "vector");
+}
+
+TEST(VirtualImageTest, AStrongestIndexOutsideThePixelsFailsWithTheMessageVector) {
+    VirtualImage image;
+    std::vector<Pixel> pixels = realPixels();
+    setValues(pixels, {{'A', 300}});
+    image.strongest[0] = 40;
+    EXPECT_EQ(outOfRangeMessage(image, pixels), "vector");
 }
 
 }  // namespace
