@@ -1,0 +1,60 @@
+#include "tools/Replayer.h"
+
+#include <gtest/gtest.h>
+
+#include "tools/EventPrinter.h"
+#include "tools/GestureScript.h"
+#include "tools/Synthesizer.h"
+
+namespace TolkaTouch::Tools {
+namespace {
+
+PipelineRecording tapRecording() {
+    return recordingFromSynthesis(synthesize(GestureScript::parse("wait 200ms\ntap volume-down 120ms\nwait 300ms\n"), 1));
+}
+
+TEST(ReplayerTest, EventsCarryTheRecordedHostClockTimes) {
+    PipelineRecording recording = tapRecording();
+    const uint64_t first = recording.frames().front().timestamp;
+    Replayer replayer(std::move(recording));
+    std::vector<std::string> lines;
+    replayer.run(ReplayOptions{1.0f, true, {}}, [&](const HIDEvent& event) {
+        EXPECT_GE(event.timestamp, kSynthesisStartNs);
+        lines.push_back(eventHumanLine(event, replayer.secondsSinceStart(event)));
+    });
+    EXPECT_EQ(replayer.origin(), first);
+    ASSERT_EQ(lines.size(), 2u);
+    EXPECT_NE(lines[0].find("may-begin   region 2  volume down"), std::string::npos) << lines[0];
+    EXPECT_NE(lines[1].find("tap         region 2  volume down"), std::string::npos) << lines[1];
+}
+
+TEST(ReplayerTest, SettingsApplyBeforeTheFirstFrame) {
+    Replayer replayer(tapRecording());
+    std::vector<std::string> kinds;
+    ReplayOptions options;
+    options.fast = true;
+    options.settings = {{"Algs.ActivationThreshold", PropertyValue(5000.0)}};
+    replayer.run(options, [&](const HIDEvent& event) { kinds.emplace_back(eventKindName(event)); });
+    EXPECT_TRUE(kinds.empty());
+    EXPECT_EQ(replayer.pipeline().getState("Algs.ActivationThreshold"), PropertyValue(5000.0f));
+}
+
+TEST(ReplayerTest, PacedReplaySleepsTheRecordedGapsDividedByTheSpeed) {
+    // Without --fast the host clock's sleep paces the frames; at a high speed that stays short
+    // while every frame still arrives.
+    Replayer replayer(tapRecording());
+    int events = 0;
+    replayer.run(ReplayOptions{100.0f, false, {}}, [&](const HIDEvent&) { ++events; });
+    EXPECT_EQ(events, 2);
+}
+
+TEST(ReplayerTest, EmptyRecordingPlaysNothing) {
+    Replayer replayer{PipelineRecording()};
+    int events = 0;
+    replayer.run(ReplayOptions{}, [&](const HIDEvent&) { ++events; });
+    EXPECT_EQ(events, 0);
+    EXPECT_EQ(replayer.origin(), 0u);
+}
+
+}  // namespace
+}  // namespace TolkaTouch::Tools

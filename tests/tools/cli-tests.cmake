@@ -1,0 +1,115 @@
+# Tests that run the built tolkatouch program, as a user runs it, through check_tolkatouch.sh.
+set(tolkatouch $<TARGET_FILE:tolkatouch>)
+set(check bash ${CMAKE_CURRENT_LIST_DIR}/check_tolkatouch.sh)
+set(expected ${CMAKE_CURRENT_LIST_DIR}/expected)
+set(data ${CMAKE_CURRENT_LIST_DIR}/data)
+set(examples ${PROJECT_SOURCE_DIR}/examples)
+
+# tolka_add_cli_test(<Sentence> <check options> -- <tolkatouch arguments>)
+function(tolka_add_cli_test name)
+  list(FIND ARGN "--" separator)
+  list(SUBLIST ARGN 0 ${separator} options)
+  math(EXPR first "${separator} + 1")
+  set(arguments)
+  list(LENGTH ARGN count)
+  if(first LESS count)
+    list(SUBLIST ARGN ${first} -1 arguments)
+  endif()
+  add_test(NAME TolkatouchCliTest.${name} COMMAND ${check} ${options} -- ${tolkatouch} ${arguments})
+  set_tests_properties(TolkatouchCliTest.${name} PROPERTIES LABELS "cli")
+endfunction()
+
+# Replay of every example, compared with what it printed when it was checked in.
+foreach(example everyday-session reset-during-hold version0-session)
+  tolka_add_cli_test(ReplayJsonFastOf-${example}-PrintsItsEvents
+    --stdout ${expected}/${example}.jsonl --stderr-empty -- replay --fast --json ${examples}/${example}.json)
+endforeach()
+tolka_add_cli_test(ReplayPrintsOneAlignedLinePerEvent
+  --stdout ${expected}/reset-during-hold.human.txt --stderr-empty -- replay --fast ${examples}/reset-during-hold.json)
+tolka_add_cli_test(ReplayWithoutDocumentPlaysTheBuiltInSample
+  --stdout ${expected}/everyday-session.jsonl -- replay --fast --json)
+tolka_add_cli_test(ReplayReadsTheDocumentFromStandardInput
+  --stdin ${examples}/reset-during-hold.json --stdout ${expected}/reset-during-hold.jsonl -- replay --fast --json -)
+tolka_add_cli_test(ReplayAtAHigherSpeedPrintsTheSameEvents
+  --stdout ${expected}/version0-session.jsonl -- replay --speed 8 --json ${examples}/version0-session.json)
+
+# Counters at the end.
+tolka_add_cli_test(ReplayStatsEndsWithATableOfTheNonZeroCounters
+  --stdout ${expected}/everyday-session.stats.txt -- replay --fast --stats ${examples}/everyday-session.json)
+tolka_add_cli_test(ReplayJsonStatsEndsWithOneStatsLine
+  --stdout ${expected}/reset-during-hold.stats.jsonl -- replay --fast --json --stats ${examples}/reset-during-hold.json)
+
+# Settings before the first frame: the 700 ms hold of the everyday session is no hold with a
+# hold timeout of 1000 ms.
+tolka_add_cli_test(ReplaySetHoldTimeoutTurnsTheShortHoldIntoNoHold
+  --stdout ${expected}/everyday-session.hold-timeout-1000.jsonl
+  -- replay --fast --json --set Algs.HoldTimeoutMilliseconds=1000 ${examples}/everyday-session.json)
+tolka_add_cli_test(ReplaySetIsRepeatable
+  --stdout ${expected}/version0-session.no-holds.jsonl
+  -- replay --fast --json --set Algs.HoldTimeoutMilliseconds=5000 --set Algs.EnableTapSuppression=false
+     ${examples}/version0-session.json)
+tolka_add_cli_test(ReplayDescribeWritesTheDescriptionsToStandardError
+  --stdout ${expected}/version0-session.jsonl --stderr-contains "*** Virtual State Description ***"
+  -- replay --fast --json --describe ${examples}/version0-session.json)
+
+# Document errors: one line on standard error, exit 1, no events.
+function(tolka_add_document_error_test name file message)
+  tolka_add_cli_test(${name} --exit 1 --stdout-empty --stderr-text "tolkatouch: ${file}: ${message}"
+    -- replay --fast --json ${file})
+endfunction()
+tolka_add_document_error_test(ReplayOfAMissingFileFails ${data}/no-such-recording.json "No such file or directory")
+tolka_add_document_error_test(ReplayOfADirectoryFails ${data} "Is a directory")
+tolka_add_document_error_test(ReplayOfTextThatIsNotJsonFails ${data}/not-json.json
+  "migrateSerializedContainer failed: invalid container")
+tolka_add_document_error_test(ReplayOfAnEmptyFileFails ${data}/empty.json "migrateSerializedContainer failed: invalid container")
+tolka_add_document_error_test(ReplayOfAnUnknownVersionFails ${data}/version-2.json
+  "migrateSerializedContainer failed: invalid container version: 2")
+tolka_add_document_error_test(ReplayOfADocumentWithoutFramesFails ${data}/no-frames.json "invalid frames")
+tolka_add_document_error_test(ReplayOfAReportThatIsNotHexFails ${data}/bad-hex.json "invalid hex string")
+tolka_add_document_error_test(ReplayOfAnUnknownFrameTypeFails ${data}/lower-case-type.json "invalid frame type")
+tolka_add_document_error_test(ReplayOfAVersionZeroReportWithoutDataFails ${data}/version-0-no-report-data.json
+  "migrateSerializedContainer failed: frame lacks ReportData")
+tolka_add_cli_test(ReplayOfABadDocumentOnStandardInputNamesIt
+  --stdin ${data}/not-json.json --exit 1 --stdout-empty
+  --stderr-text "tolkatouch: -: migrateSerializedContainer failed: invalid container" -- replay -)
+tolka_add_cli_test(ShowOfABadDocumentFails --exit 1 --stdout-empty
+  --stderr-text "tolkatouch: ${data}/version-2.json: migrateSerializedContainer failed: invalid container version: 2"
+  -- show ${data}/version-2.json)
+tolka_add_cli_test(ConvertOfAMissingFileFails --exit 1 --stdout-empty
+  --stderr-text "tolkatouch: ${data}/no-such-recording.json: No such file or directory"
+  -- convert ${data}/no-such-recording.json -o -)
+
+# Bad options: the usage, exit 2.
+tolka_add_cli_test(NoSubcommandPrintsTheUsage --exit 2 --stdout-empty --stderr-contains "Usage: tolkatouch" --)
+tolka_add_cli_test(UnknownOptionPrintsTheUsage --exit 2 --stdout-empty --stderr-contains "Usage: tolkatouch replay"
+  -- replay --fastest ${examples}/version0-session.json)
+tolka_add_cli_test(SpeedAndFastTogetherPrintTheUsage --exit 2 --stdout-empty --stderr-contains "Usage: tolkatouch replay"
+  -- replay --fast --speed 2 ${examples}/version0-session.json)
+tolka_add_cli_test(SpeedOfZeroPrintsTheUsage --exit 2 --stdout-empty --stderr-contains "Usage: tolkatouch replay"
+  -- replay --speed 0 ${examples}/version0-session.json)
+tolka_add_cli_test(SetWithoutEqualsPrintsTheUsage --exit 2 --stdout-empty --stderr-contains "Usage: tolkatouch replay"
+  -- replay --set Algs.HoldTimeoutMilliseconds ${examples}/version0-session.json)
+tolka_add_cli_test(ConvertWithoutOutputPrintsTheUsage --exit 2 --stdout-empty --stderr-contains "Usage: tolkatouch convert"
+  -- convert ${examples}/version0-session.json)
+foreach(command replay synth show convert)
+  tolka_add_cli_test(HelpOf-${command}-Succeeds --stderr-empty -- ${command} --help)
+endforeach()
+
+# synth: every example script gives back its checked-in document.
+foreach(example everyday-session reset-during-hold)
+  tolka_add_cli_test(SynthOf-${example}-ReproducesItsDocument
+    --stdout ${examples}/${example}.json --stderr-empty -- synth ${examples}/${example}.txt)
+endforeach()
+tolka_add_cli_test(SynthOfABadScriptNamesTheLine --exit 1 --stdout-empty
+  --stderr-text "tolkatouch: ${data}/bad-gesture.txt: line 3: unknown gesture 'jump' (tap, hold, slide, brush, wait, reset, set)"
+  -- synth ${data}/bad-gesture.txt)
+
+# show and convert.
+tolka_add_cli_test(ShowFrameDrawsThatImage
+  --stdout ${expected}/everyday-session.frame-1279.txt -- show --frame 1279 ${examples}/everyday-session.json)
+tolka_add_cli_test(ShowRawDrawsTheRawReadings
+  --stdout ${expected}/everyday-session.frame-1279.raw.txt -- show --raw --frame 1279 ${examples}/everyday-session.json)
+tolka_add_cli_test(ShowListsResetsAndImagesInOrder
+  --stdout ${expected}/short-with-reset.show.txt -- show ${data}/short-with-reset.json)
+tolka_add_cli_test(ConvertOfTheVersionZeroExampleWritesVersionOne
+  --stdout ${expected}/version0-session.converted.json -- convert ${examples}/version0-session.json -o -)

@@ -1,0 +1,84 @@
+// tolkatouch prop get KEY / prop set KEY VALUE: reads and writes a property of the service that
+// tolkatouchd runs for a surface, through the daemon's control socket.
+
+#include <cstdio>
+#include <memory>
+#include <optional>
+#include <string>
+
+#include <CLI/CLI.hpp>
+
+#include "pipeline/PropertyValueJson.h"
+#include "tools/Commands.h"
+#include "tools/ControlClient.h"
+#include "tools/DocumentFile.h"
+#include "tools/SettingValue.h"
+
+namespace TolkaTouch::Tools {
+
+namespace {
+
+struct PropArguments {
+    std::string socket = defaultControlSocketPath();
+    std::string key;
+    std::string value;
+    std::optional<uint32_t> device;
+};
+
+nlohmann::json withDevice(nlohmann::json request, const std::optional<uint32_t>& device) {
+    if (device) request["device"] = *device;
+    return request;
+}
+
+// A text value is printed as it is, so that "Recording" saved to a file is the document itself;
+// anything else as one line of JSON.
+void printValue(const nlohmann::json& value) {
+    std::string text = value.is_string() ? value.get<std::string>()
+                                         : value.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+    if (text.empty() || text.back() != '\n') text += '\n';
+    std::fwrite(text.data(), 1, text.size(), stdout);
+    std::fflush(stdout);
+}
+
+void runGet(const PropArguments& arguments) {
+    auto reply = controlRequest(arguments.socket, withDevice({{"get", arguments.key}}, arguments.device), arguments.key);
+    printValue(reply.value("value", nlohmann::json()));
+}
+
+void runSet(const PropArguments& arguments) {
+    nlohmann::json request = {{"set", arguments.key}, {"value", nlohmann::json(PropertyValueJson::toJson(settingValueFromText(arguments.value)))}};
+    auto reply = controlRequest(arguments.socket, withDevice(request, arguments.device), arguments.key);
+    if (reply.value("ok", false) != true) throw ToolError(arguments.key, "the service did not take the value");
+}
+
+void addSocketAndDevice(CLI::App* command, PropArguments& arguments) {
+    command->add_option("--socket", arguments.socket, "tolkatouchd's control socket")->capture_default_str();
+    command->add_option("--device", arguments.device,
+                        "the service number of the surface (see tolkatouch devices); default: the first");
+}
+
+}  // namespace
+
+void addPropCommand(CLI::App& app) {
+    auto arguments = std::make_shared<PropArguments>();
+    CLI::App* prop = app.add_subcommand(
+        "prop", "Read or write a property of the running service through tolkatouchd's control socket.");
+    prop->require_subcommand(1);
+
+    CLI::App* get = prop->add_subcommand(
+        "get", "Print a property: text as it is (\"Recording\" saved to a file replays with tolkatouch replay), "
+               "anything else as JSON.");
+    get->add_option("KEY", arguments->key, "e.g. Version, Recording, Pipeline.Algs.HoldTimeoutMilliseconds")->required();
+    addSocketAndDevice(get, *arguments);
+    get->callback([arguments] { runGet(*arguments); });
+
+    CLI::App* set = prop->add_subcommand(
+        "set", "Write a property; the service uses a setting from the next frame on.");
+    set->add_option("KEY", arguments->key, "e.g. Pipeline.Algs.HoldTimeoutMilliseconds")->required();
+    set->add_option("VALUE", arguments->value, "read as JSON (700, true, 0.5, [1, 2]), otherwise as a string")
+        ->required();
+    addSocketAndDevice(set, *arguments);
+    set->callback([arguments] { runSet(*arguments); });
+}
+
+}  // namespace TolkaTouch::Tools

@@ -1,0 +1,105 @@
+// tolkatouch replay: plays a recording document through a fresh pipeline and prints its events.
+
+#include <cstdio>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include <CLI/CLI.hpp>
+
+#include "platform/Log.h"
+#include "tools/Commands.h"
+#include "tools/DocumentFile.h"
+#include "tools/EventPrinter.h"
+#include "tools/Replayer.h"
+#include "tools/SampleRecording.h"
+#include "tools/SettingValue.h"
+#include "tools/StatsPrinter.h"
+
+namespace TolkaTouch::Tools {
+
+namespace {
+
+struct ReplayArguments {
+    std::string document;
+    float speed = 1.0f;
+    bool fast = false;
+    bool json = false;
+    std::vector<std::string> settings;
+    bool describe = false;
+    bool stats = false;
+};
+
+PipelineRecording recordingToReplay(const std::string& document) {
+    if (!document.empty()) return loadRecording(document);
+    const std::string_view sample = sampleRecordingDocument();
+    return recordingFromDocument(std::vector<uint8_t>(sample.begin(), sample.end()), kSampleRecordingName);
+}
+
+void runReplay(const ReplayArguments& arguments) {
+    Replayer replayer(recordingToReplay(arguments.document));
+
+    ReplayOptions options;
+    options.speed = arguments.speed;
+    options.fast = arguments.fast;
+    for (const std::string& assignment : arguments.settings) options.settings.push_back(settingFromAssignment(assignment));
+
+    if (arguments.describe) {
+        SystemLog::setDefaultDestination(SystemLog::Destination::StandardError);
+        SystemLog::setDebugEnabled(true);
+    }
+
+    // Lines go out as the events happen, also when standard output is a pipe.
+    replayer.run(options, [&](const HIDEvent& event) {
+        const std::string line =
+            arguments.json ? eventJsonLine(event) : eventHumanLine(event, replayer.secondsSinceStart(event));
+        std::fputs(line.c_str(), stdout);
+        std::fputc('\n', stdout);
+        if (!arguments.fast) std::fflush(stdout);
+    });
+
+    if (arguments.stats) {
+        const std::string stats = arguments.json ? statsJsonLine(replayer.pipeline()) + "\n" : statsTable(replayer.pipeline());
+        std::fputs(stats.c_str(), stdout);
+    }
+    std::fflush(stdout);
+}
+
+}  // namespace
+
+void addReplayCommand(CLI::App& app) {
+    auto arguments = std::make_shared<ReplayArguments>();
+    CLI::App* command = app.add_subcommand(
+        "replay",
+        "Play a recording document through a fresh pipeline and print every event it produces. Without DOCUMENT, "
+        "plays the built-in sample recording.");
+    command->add_option("DOCUMENT", arguments->document, "Recording document to play; - reads standard input");
+    CLI::Option* speed = command->add_option("--speed", arguments->speed, "Playback speed factor (default 1.0: as recorded)")
+                             ->type_name("X")
+                             ->check(CLI::Validator(
+                                 [](std::string& text) {
+                                     float value = 0.0f;
+                                     return CLI::detail::lexical_cast(text, value) && value > 0.0f
+                                                ? std::string()
+                                                : std::string("the speed must be a number above 0");
+                                 },
+                                 ""));
+    command->add_flag("--fast", arguments->fast, "Deliver every frame at once, without pacing")->excludes(speed);
+    command->add_flag("--json", arguments->json, "Print one JSON object per event");
+    command->add_option("--set", arguments->settings,
+                        "Apply a setting before the first frame, e.g. Algs.HoldTimeoutMilliseconds=700; VALUE is read "
+                        "as JSON, otherwise as a string (repeatable)")
+        ->type_name("KEY=VALUE")
+        ->expected(1)
+        ->allow_extra_args(false)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
+        ->check(CLI::Validator(
+            [](std::string& text) { return text.find('=') == std::string::npos ? std::string("expected KEY=VALUE") : std::string(); },
+            ""));
+    command->add_flag("--describe", arguments->describe,
+                      "Enable the debug level of the system log: per-frame statistics and descriptions go to standard error");
+    command->add_flag("--stats", arguments->stats, "End with the pipeline's counters and the event statistics");
+    command->callback([arguments] { runReplay(*arguments); });
+}
+
+}  // namespace TolkaTouch::Tools

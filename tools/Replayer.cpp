@@ -1,0 +1,40 @@
+#include "tools/Replayer.h"
+
+#include "pipeline/common/Util.h"
+#include "platform/HostClock.h"
+
+namespace TolkaTouch::Tools {
+
+Replayer::Replayer(PipelineRecording recording)
+    : _recording(std::move(recording)), _pipeline(std::make_shared<Pipeline>()) {
+    _recording.pipeline = _pipeline;
+    if (!_recording.frames().empty()) _origin = Util::machTimeFromNanoseconds(_recording.frames().front().timestamp);
+}
+
+void Replayer::run(const ReplayOptions& options, const std::function<void(const HIDEvent&)>& onEvent) {
+    const uint64_t origin = _origin;
+    _recording.clock.now = [origin] { return origin; };
+    if (options.fast) {
+        _recording.clock.sleepMicroseconds = [](uint64_t) {};
+    } else {
+        _recording.clock.sleepMicroseconds = Host::sleepMicroseconds;
+    }
+
+    _pipeline->hidEventsProbe = [&onEvent](const EventList& events) {
+        for (const HIDEventRef& event : events) onEvent(*event);
+    };
+    _pipeline->setTime(origin);
+    for (const auto& [key, value] : options.settings) _pipeline->setState(key, value);
+
+    _recording.playReset();
+    while (_recording.playCanContinue()) _recording.playNextFrame(options.speed);
+    _pipeline->hidEventsProbe = nullptr;
+}
+
+double Replayer::secondsSinceStart(const HIDEvent& event) const {
+    // A document whose frames go back in time puts an event before the first frame.
+    if (event.timestamp < _origin) return -static_cast<double>(Util::nanosecondsFromMachTime(_origin - event.timestamp)) / 1e9;
+    return static_cast<double>(Util::nanosecondsFromMachTime(event.timestamp - _origin)) / 1e9;
+}
+
+}  // namespace TolkaTouch::Tools

@@ -1,0 +1,47 @@
+#pragma once
+// Replayer: plays a recording into a fresh Pipeline, as `tolkatouch replay` does, and hands
+// every event the pipeline's HID events probe receives to the caller as it happens.
+//
+// The replay clock starts at the first frame's recorded time, so the events carry the host
+// clock times at which the recorded frames arrived, whatever the speed. Pacing sleeps on the
+// host clock unless the replay is fast.
+
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "pipeline/Pipeline.h"
+#include "pipeline/PipelineRecording.h"
+
+namespace TolkaTouch::Tools {
+
+struct ReplayOptions {
+    float speed = 1.0f;
+    bool fast = false;  // every frame at once, no sleeping
+    std::vector<std::pair<std::string, PropertyValue>> settings;  // applied before the first frame
+};
+
+class Replayer {
+public:
+    explicit Replayer(PipelineRecording recording);
+
+    // Plays every frame once; onEvent sees each event after the pipeline stamped it.
+    void run(const ReplayOptions& options, const std::function<void(const HIDEvent&)>& onEvent);
+
+    // The replay clock at the first frame, in host clock ticks.
+    uint64_t origin() const { return _origin; }
+    // Seconds from the first frame to an event's time stamp.
+    double secondsSinceStart(const HIDEvent& event) const;
+
+    Pipeline& pipeline() { return *_pipeline; }
+
+private:
+    PipelineRecording _recording;
+    std::shared_ptr<Pipeline> _pipeline;
+    uint64_t _origin = 0;
+};
+
+}  // namespace TolkaTouch::Tools

@@ -1,0 +1,52 @@
+// tolkatouch: the touch surface's command-line tool. One program with a subcommand per job;
+// every subcommand has --help.
+
+#include <cstdio>
+#include <exception>
+
+#include <CLI/CLI.hpp>
+
+#include "tools/Commands.h"
+#include "tools/DocumentFile.h"
+
+namespace {
+
+constexpr int kExitFailure = 1;
+constexpr int kExitUsage = 2;
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    using namespace TolkaTouch::Tools;
+
+    CLI::App app{"Replays, synthesises, shows and converts the touch surface's recordings.", "tolkatouch"};
+    app.require_subcommand(1);
+    app.failure_message(CLI::FailureMessage::help);
+
+    addReplayCommand(app);
+    addSynthCommand(app);
+    addShowCommand(app);
+    addConvertCommand(app);
+    addUhidCommand(app);
+    addKeysCommand(app);
+    addPropCommand(app);
+    addDevicesCommand(app);
+
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        // Help is an answer, not an error; anything else the parser refuses is a usage error.
+        if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) return app.exit(error);
+        app.exit(error);
+        return kExitUsage;
+    } catch (const ToolError& error) {
+        std::fflush(stdout);
+        std::fprintf(stderr, "tolkatouch: %s\n", error.what());
+        return kExitFailure;
+    } catch (const std::exception& error) {
+        std::fflush(stdout);
+        std::fprintf(stderr, "tolkatouch: %s\n", error.what());
+        return kExitFailure;
+    }
+    return 0;
+}
