@@ -101,7 +101,9 @@ void TolkaTouchHIDService::handleInputReports(const DispatchEventInfo* dispatchE
 
     std::shared_ptr<RunLoop> runLoop = RunLoop::current();
     auto reportBuffer = std::make_unique<uint8_t[]>(kInputReportBufferLength);
-    HIDDeviceRef device = _tolkaDevice;  // a host that schedules before start gets an idle thread
+    // A host that schedules before a successful start has no device here: the run loop then has
+    // nothing to serve in its mode and the thread ends at once; unschedule still finds it done.
+    HIDDeviceRef device = _tolkaDevice;
     if (device) {
         device->registerInputReportCallback(reportBuffer.get(), kInputReportBufferLength, inputReportCallback,
                                             &handler);

@@ -262,6 +262,20 @@ TEST_F(PipelineTest, TouchEventsAreStampedWithTheTimeOfTheirReport) {
     EXPECT_EQ(event.integerValue(kDigitizerFrameNumberField), frame - 1);
 }
 
+TEST_F(PipelineTest, FirmwareResetDuringATouchPutsTheVendorEventAfterTheRecognizersOwnAndStampsThemAll) {
+    for (uint32_t frame = 1; frame < 40 && lists.empty(); ++frame) send(imageReport(frame, frame * 8, 3000));
+    ASSERT_FALSE(lists.empty()) << "a strong touch produced no event";
+    const size_t before = lists.size();
+    pipeline.setTime(5555);
+    send(firmwareEventReport(0));
+    ASSERT_EQ(lists.size(), before + 1);
+    const EventList& events = lists.back();
+    ASSERT_GE(events.size(), 2u) << "the reset ended no touch";
+    for (size_t i = 0; i + 1 < events.size(); ++i) EXPECT_EQ(events[i]->type, HIDEventType::Digitizer);
+    EXPECT_EQ(events.back()->type, HIDEventType::VendorDefined);
+    for (const HIDEventRef& event : events) EXPECT_EQ(event->timestamp, 5555u);
+}
+
 TEST_F(PipelineTest, ImageProbesComeInOrderBeforeTheEvents) {
     send(imageReport(1, 0, 0));
     ASSERT_TRUE(lists.empty());

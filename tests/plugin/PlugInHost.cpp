@@ -1,6 +1,8 @@
 #include "tests/plugin/PlugInHost.h"
 
 #include <dlfcn.h>
+#include <sys/eventfd.h>
+#include <unistd.h>
 
 #include <atomic>
 #include <cstdio>
@@ -174,6 +176,88 @@ void PlugInHost::release() {
     _released = true;
     if (service) (*service)->Release(service);
     if (plugin) (*plugin)->Release(plugin);
+}
+
+CallLogDevice::CallLogDevice() : _neverReadable(eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK)) {}
+
+CallLogDevice::~CallLogDevice() {
+    if (_neverReadable >= 0) ::close(_neverReadable);
+}
+
+void CallLogDevice::note(std::string call) const {
+    std::lock_guard lock(_mutex);
+    _calls.push_back(std::move(call));
+}
+
+uint32_t CallLogDevice::open(uint32_t options) {
+    note("open " + std::to_string(options));
+    return HIDResult::Success;
+}
+
+uint32_t CallLogDevice::close(uint32_t options) {
+    note("close " + std::to_string(options));
+    return HIDResult::Success;
+}
+
+PropertyValue CallLogDevice::getProperty(std::string_view key) const {
+    note("getProperty " + std::string(key));
+    return {};
+}
+
+bool CallLogDevice::setProperty(std::string_view key, PropertyValue value) {
+    note("setProperty " + std::string(key) + " " + value.description());
+    return true;
+}
+
+uint32_t CallLogDevice::getReport(HIDReportType type, uint32_t reportID, uint8_t*, size_t& length) {
+    char call[64];
+    std::snprintf(call, sizeof call, "getReport %s 0x%02x %zu", type == HIDReportType::Feature ? "Feature" : "Other",
+                  reportID, length);
+    note(call);
+    return HIDResult::Unsupported;
+}
+
+void CallLogDevice::registerInputReportCallback(uint8_t* buffer, size_t length, InputReportCallback callback,
+                                                void* context) {
+    {
+        std::lock_guard lock(_mutex);
+        _buffers.push_back(buffer);
+    }
+    note("register " + std::to_string(length) + (callback ? " callback" : " null") + (context ? " context" : " null"));
+}
+
+void CallLogDevice::scheduleWithRunLoop(RunLoop& runLoop, const std::string& mode) {
+    note("schedule " + mode + (runLoop.isCurrent() ? "" : " (from another thread)"));
+    _source = runLoop.addSource(_neverReadable, mode, [] {});
+}
+
+void CallLogDevice::unscheduleFromRunLoop(RunLoop& runLoop, const std::string& mode) {
+    note("unschedule " + mode + (runLoop.isCurrent() ? "" : " (from another thread)"));
+    runLoop.removeSource(_source);
+    _source = 0;
+}
+
+void CallLogDevice::setRemovalHandler(std::function<void()>) {}
+
+std::vector<std::string> CallLogDevice::calls() const {
+    std::lock_guard lock(_mutex);
+    return _calls;
+}
+
+bool CallLogDevice::oneBufferThroughout() const {
+    std::lock_guard lock(_mutex);
+    for (const uint8_t* buffer : _buffers) {
+        if (buffer != _buffers.front()) return false;
+    }
+    return true;
+}
+
+ServedDevice::ServedDevice(std::shared_ptr<HIDDevice> device) : serviceHandle(uniqueServiceHandle()) {
+    HIDServiceRegistry::registerService(serviceHandle, [device] { return device; });
+}
+
+ServedDevice::~ServedDevice() {
+    HIDServiceRegistry::unregisterService(serviceHandle);
 }
 
 namespace {

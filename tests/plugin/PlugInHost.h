@@ -13,9 +13,11 @@
 #include <vector>
 
 #include "platform/DispatchQueue.h"
+#include "platform/HIDDevice.h"
 #include "platform/HIDEvent.h"
 #include "platform/Log.h"
 #include "platform/PropertyValue.h"
+#include "platform/RunLoop.h"
 #include "platform/SimulatedHIDDevice.h"
 #include "platform/Trace.h"
 #include "plugin/HIDServicePlugin.h"
@@ -135,6 +137,52 @@ public:
 
 private:
     bool _released = false;
+};
+
+// A device that sends nothing and writes down every call the service makes of it, with the
+// buffer lengths, report IDs and run loop modes it was given, so that a test can read exactly
+// how the service uses its device. Scheduling adds a source that never fires, so a run loop in
+// that mode waits until it is stopped.
+class CallLogDevice : public HIDDevice {
+public:
+    CallLogDevice();
+    ~CallLogDevice() override;
+
+    uint32_t open(uint32_t options) override;
+    uint32_t close(uint32_t options) override;
+    PropertyValue getProperty(std::string_view key) const override;
+    bool setProperty(std::string_view key, PropertyValue value) override;
+    uint32_t getReport(HIDReportType type, uint32_t reportID, uint8_t* buffer, size_t& length) override;
+    void registerInputReportCallback(uint8_t* buffer, size_t length, InputReportCallback callback,
+                                     void* context) override;
+    void scheduleWithRunLoop(RunLoop& runLoop, const std::string& mode) override;
+    void unscheduleFromRunLoop(RunLoop& runLoop, const std::string& mode) override;
+    void setRemovalHandler(std::function<void()> handler) override;
+
+    // "open 0", "getReport Feature 0x10 128", "register 512 callback context",
+    // "schedule kHandleInputReportsRunLoopMode", "unschedule ...", "register 512 null null", ...
+    std::vector<std::string> calls() const;
+    // Whether every registration and unregistration named the same buffer.
+    bool oneBufferThroughout() const;
+
+private:
+    void note(std::string call) const;
+
+    mutable std::mutex _mutex;
+    mutable std::vector<std::string> _calls;  // getProperty is const, and noted too
+    std::vector<const uint8_t*> _buffers;
+    int _neverReadable;
+    RunLoop::SourceID _source = 0;
+};
+
+// Registers `device` under a new service handle for the life of the object.
+class ServedDevice {
+public:
+    explicit ServedDevice(std::shared_ptr<HIDDevice> device);
+    ~ServedDevice();
+    ServedDevice(const ServedDevice&) = delete;
+    ServedDevice& operator=(const ServedDevice&) = delete;
+    uint32_t serviceHandle;
 };
 
 // Report bytes as the surface sends them.

@@ -294,6 +294,59 @@ TEST(TolkaTouchHIDServiceLifecycleTest, RecordingOfAFreshServiceKeepsAtMost1350F
     host.halt();
 }
 
+TEST(TolkaTouchHIDServiceLifecycleTest, ThreadListensWithA512ByteBufferInItsPrivateModeAndUndoesItInReverse) {
+    auto device = std::make_shared<Testing::CallLogDevice>();
+    Testing::ServedDevice served(device);
+    PlugInHost host;
+    ASSERT_EQ((*host.plugin)->Start(host.plugin, nullptr, served.serviceHandle), Host::kResultSuccess);
+    host.open();
+    host.setEventCallback();
+    host.schedule();
+    ASSERT_TRUE(eventually([&] { return device->calls().size() == 3; }));
+    host.unschedule();
+    host.close();
+    host.stop();
+    EXPECT_EQ(device->calls(), (std::vector<std::string>{
+                                   "open 0",
+                                   "register 512 callback context",
+                                   "schedule kHandleInputReportsRunLoopMode",
+                                   "unschedule kHandleInputReportsRunLoopMode",
+                                   "register 512 null null",
+                                   "close 0",
+                               }));
+    EXPECT_TRUE(device->oneBufferThroughout());
+}
+
+TEST(TolkaTouchHIDServiceLifecycleTest, ReportLongerThan512BytesIsCutToTheThreadsBuffer) {
+    PlugInHost host;
+    host.run();
+    std::vector<uint8_t> longReport(600, 0x07);
+    longReport[0] = 0x09;
+    host.write(longReport);
+    host.write(firmwareEventReport(0));
+    ASSERT_TRUE(host.collector.waitForCount(1));
+    host.halt();
+
+    PropertyValue document = host.copyProperty("Recording");
+    std::vector<uint8_t> bytes(document.string()->begin(), document.string()->end());
+    PipelineRecording recording(&bytes);
+    ASSERT_EQ(recording.frames().size(), 2u);
+    EXPECT_EQ(recording.frames().front().report, std::vector<uint8_t>(longReport.begin(), longReport.begin() + 512));
+}
+
+// A host that schedules before a successful start is in error; the service's thread then has no
+// device to listen to, ends by itself, and unschedule still returns.
+TEST(TolkaTouchHIDServiceLifecycleTest, ScheduleWithoutADeviceRunsAThreadThatEndsAndUnscheduleStillReturns) {
+    SinkInstallation sinks;
+    PlugInHost host;
+    host.setEventCallback();
+    host.schedule();
+    host.unschedule();
+    EXPECT_TRUE(eventually([&] { return hasLine(*sinks.log, "input report thread end"); }));
+    EXPECT_TRUE(hasLine(*sinks.log, "input report thread exited"));
+    EXPECT_EQ(host.device->counts(), SimulatedHIDDevice::Counts{});
+}
+
 TEST(TolkaTouchHIDServiceLifecycleTest, ServiceReleasedRightAfterUnscheduleIsDestroyed) {
     SinkInstallation sinks;
     for (int i = 0; i < 20; ++i) {

@@ -201,5 +201,56 @@ TEST_F(TolkaTouchHIDServicePropertiesTest, PropertyCallsLogTheirKeysAndValues) {
                                      }));
 }
 
+// A service started on a device that writes down every call made of it.
+struct TolkaTouchHIDServiceDeviceCallsTest : ::testing::Test {
+    std::shared_ptr<Testing::CallLogDevice> device = std::make_shared<Testing::CallLogDevice>();
+    Testing::ServedDevice served{device};
+    PlugInHost host;
+    void SetUp() override {
+        ASSERT_EQ((*host.plugin)->Start(host.plugin, nullptr, served.serviceHandle), Host::kResultSuccess);
+    }
+};
+
+TEST_F(TolkaTouchHIDServiceDeviceCallsTest, FeatureReportsAreReadInTableOrderInto128ByteBuffersAndTheHoldDurationInto32) {
+    host.copyProperty("FirmwareDebugReports");
+    host.copyProperty("FactoryResetHoldDuration");
+    EXPECT_EQ(device->calls(), (std::vector<std::string>{
+                                   "getReport Feature 0x04 128",
+                                   "getReport Feature 0x10 128",
+                                   "getReport Feature 0x11 128",
+                                   "getReport Feature 0x12 128",
+                                   "getReport Feature 0x13 128",
+                                   "getReport Feature 0x1d 128",
+                                   "getReport Feature 0x32 128",
+                                   "getReport Feature 0x3b 128",
+                                   "getReport Feature 0x3c 128",
+                                   "getReport Feature 0x3f 128",
+                                   "getReport Feature 0x1f 32",
+                               }));
+}
+
+TEST_F(TolkaTouchHIDServiceDeviceCallsTest, FailureTextNamesTheReportIdWithoutPadding) {
+    PropertyValue reports = host.copyProperty("FirmwareDebugReports");
+    ASSERT_NE(reports.find("0x04"), nullptr);
+    EXPECT_EQ(*reports.find("0x04"), PropertyValue("Failed to get report ID 0x4: 0xe00002c7"));
+    EXPECT_EQ(*reports.find("0x3f"), PropertyValue("Failed to get report ID 0x3f: 0xe00002c7"));
+}
+
+TEST_F(TolkaTouchHIDServiceDeviceCallsTest, PipelineKeysNeverReachTheDeviceWhateverTheirSubKey) {
+    EXPECT_TRUE(host.copyProperty("Pipeline.Version").isNull());
+    EXPECT_TRUE(host.copyProperty("Pipeline.Recording").isNull());
+    EXPECT_TRUE(host.setProperty("Pipeline.Version", PropertyValue(1)));
+    EXPECT_TRUE(device->calls().empty());
+}
+
+TEST_F(TolkaTouchHIDServiceDeviceCallsTest, ServiceKeysAreReadByTheServiceAndWrittenToTheDevice) {
+    host.copyProperty("Version");
+    host.copyProperty("Recording");
+    EXPECT_TRUE(device->calls().empty());
+    EXPECT_TRUE(host.setProperty("Recording", PropertyValue("x")));
+    host.copyProperty("Other");
+    EXPECT_EQ(device->calls(), (std::vector<std::string>{"setProperty Recording \"x\"", "getProperty Other"}));
+}
+
 }  // namespace
 }  // namespace TolkaTouch
