@@ -29,7 +29,9 @@ namespace {
 class LevelTable {
 public:
     static LevelTable& shared() {
-        static LevelTable table;
+        // Never destroyed: a detached thread (a plug-in's report thread ending) may still log
+        // while the process runs its exit handlers.
+        static LevelTable& table = *new LevelTable;
         return table;
     }
 
@@ -116,7 +118,7 @@ struct SinkState {
     std::shared_ptr<LogSink> standardError = std::make_shared<StandardErrorSink>();
 
     static SinkState& shared() {
-        static SinkState state;
+        static SinkState& state = *new SinkState;  // never destroyed, as the level table
         return state;
     }
 

@@ -32,11 +32,15 @@ bool SimulatedHIDDevice::writeInputReport(const uint8_t* bytes, size_t length) {
 }
 
 bool SimulatedHIDDevice::writeInputReport(std::vector<uint8_t> bytes) {
-    std::lock_guard lock(_mutex);
-    if (_ended) {
-        return false;
+    {
+        std::lock_guard lock(_mutex);
+        if (_ended) {
+            return false;
+        }
+        _reports.push_back(std::move(bytes));
     }
-    _reports.push_back(std::move(bytes));
+    // Counted after the report is queued and outside the lock, so the woken reader finds the
+    // report and does not have to wait for the writer to let go of the lock.
     const uint64_t one = 1;
     [[maybe_unused]] const ssize_t written = ::write(_eventFd, &one, sizeof one);
     return true;

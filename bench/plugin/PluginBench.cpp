@@ -18,6 +18,7 @@
 #include "platform/HIDServiceRegistry.h"
 #include "platform/Log.h"
 #include "platform/SimulatedHIDDevice.h"
+#include "platform/Trace.h"
 #include "plugin/HIDServicePlugin.h"
 #include "plugin/TolkaTouchHIDService.h"
 
@@ -42,6 +43,22 @@ void eventCallback(void* target, void*, void*, const HIDEventRef&, uint32_t) {
     callbackTarget->lastCall = Clock::now();
     callbackTarget->count.fetch_add(1, std::memory_order_release);
     callbackTarget->count.notify_one();
+}
+
+// Times the trace points of the road of one report: the input report probe on the report thread
+// and the dispatch task landing on the host's queue, to split the latency into its hops.
+class HopTimes : public Trace::Sink {
+public:
+    void record(const Trace::Record& record) override {
+        if (record.code == 0x2B150180) reportThread.store(Clock::now().time_since_epoch().count());
+        if (record.code == 0x2B150184) queueLanding.store(Clock::now().time_since_epoch().count());
+    }
+    std::atomic<Clock::rep> reportThread{0};
+    std::atomic<Clock::rep> queueLanding{0};
+};
+
+double microsecondsBetween(Clock::rep from, Clock::rep to) {
+    return std::chrono::duration<double, std::micro>(Clock::duration(to - from)).count();
 }
 
 Host::PlugInFactoryFunction loadFactory() {
@@ -81,9 +98,14 @@ void ReportToCallbackLatency(benchmark::State& state) {
     (*service)->setEventCallback(service, eventCallback, &target, nullptr);
     (*service)->scheduleWithDispatchQueue(service, &queue);
 
+    auto hops = std::make_shared<HopTimes>();
+    Trace::setSink(hops);
+
     const std::vector<uint8_t> report = firmwareReset();
-    std::vector<double> latencies;
+    std::vector<double> latencies, toReportThread, toQueue;
     latencies.reserve(static_cast<size_t>(state.max_iterations));
+    toReportThread.reserve(static_cast<size_t>(state.max_iterations));
+    toQueue.reserve(static_cast<size_t>(state.max_iterations));
     for (auto _ : state) {
         const uint64_t before = target.count.load(std::memory_order_acquire);
         const Clock::time_point written = Clock::now();
@@ -93,8 +115,13 @@ void ReportToCallbackLatency(benchmark::State& state) {
         }
         const double seconds = std::chrono::duration<double>(target.lastCall - written).count();
         latencies.push_back(seconds * 1e6);
+        toReportThread.push_back(microsecondsBetween(written.time_since_epoch().count(), hops->reportThread.load()));
+        toQueue.push_back(microsecondsBetween(hops->reportThread.load(), hops->queueLanding.load()));
         state.SetIterationTime(seconds);
     }
+    Trace::setSink(nullptr);
+    state.counters["to_report_thread_median_us"] = percentile(toReportThread, 0.50);
+    state.counters["to_queue_median_us"] = percentile(toQueue, 0.50);
     state.counters["median_us"] = percentile(latencies, 0.50);
     state.counters["p99_us"] = percentile(latencies, 0.99);
     state.counters["max_us"] = percentile(latencies, 1.0);

@@ -1,0 +1,77 @@
+#include "daemon/ControlRequests.h"
+
+#include "daemon/ControlServer.h"
+#include "daemon/PropertyJson.h"
+
+namespace TolkaTouch {
+
+namespace {
+using nlohmann::json;
+
+std::string dump(const json& reply) {
+    return reply.dump(-1, ' ', false, json::error_handler_t::replace);
+}
+
+std::string error(const std::string& message) {
+    return dump(json{{"error", message}});
+}
+
+std::string noSuchDevice(std::optional<uint32_t> service) {
+    return error(service ? "no device with service " + std::to_string(*service) : "no device");
+}
+}  // namespace
+
+std::string answerControlRequest(const std::string& line, ControlTarget& target) {
+    // Requests are flat: a value nested deeper than this is refused before anything walks it.
+    constexpr int kMaxDepth = 64;
+    bool tooDeep = false;
+    json request = json::parse(
+        line,
+        [&tooDeep](int depth, json::parse_event_t, json&) {
+            if (depth > kMaxDepth) tooDeep = true;
+            return !tooDeep;
+        },
+        false);
+    if (tooDeep || request.is_discarded() || !request.is_object()) return error("malformed request");
+
+    std::optional<uint32_t> service;
+    if (auto it = request.find("device"); it != request.end()) {
+        if (!it->is_number_unsigned() || it->get<uint64_t>() > UINT32_MAX) {
+            return error("malformed request: \"device\" takes a service number");
+        }
+        service = it->get<uint32_t>();
+    }
+
+    if (auto it = request.find("get"); it != request.end()) {
+        if (!it->is_string()) return error("malformed request: \"get\" takes a key string");
+        auto value = target.getProperty(service, it->get<std::string>());
+        if (!value) return noSuchDevice(service);
+        return dump(json{{"value", jsonFromProperty(*value)}});
+    }
+    if (auto it = request.find("set"); it != request.end()) {
+        auto value = request.find("value");
+        if (!it->is_string() || value == request.end()) {
+            return error("malformed request: \"set\" takes a key string and a \"value\"");
+        }
+        auto ok = target.setProperty(service, it->get<std::string>(), propertyFromJson(*value));
+        if (!ok) return noSuchDevice(service);
+        return dump(json{{"ok", *ok}});
+    }
+    if (auto it = request.find("devices"); it != request.end() && *it == true) {
+        auto list = json::array();
+        for (const auto& device : target.devices()) {
+            list.push_back(json{{"service", device.service},
+                                {"node", device.node},
+                                {"vendor", device.vendor},
+                                {"product", device.product}});
+        }
+        return dump(json{{"devices", list}});
+    }
+    return error("unknown request");
+}
+
+std::string oversizedControlRequestReply() {
+    return error("request too long (over " + std::to_string(ControlServer::kMaxLineLength) + " bytes)");
+}
+
+}  // namespace TolkaTouch

@@ -1,0 +1,217 @@
+#include "daemon/ControlServer.h"
+
+#include <fcntl.h>
+#include <sys/epoll.h>
+#include <sys/file.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstring>
+#include <stdexcept>
+#include <vector>
+
+namespace TolkaTouch {
+
+struct ControlServer::Client {
+    int fd = -1;
+    std::string input;        // bytes of the line being read
+    bool discarding = false;  // inside an oversized line: drop bytes up to its newline
+    std::string output;       // replies not yet written
+    std::size_t outputOffset = 0;
+    bool wantsWrite = false;
+    bool closing = false;  // the peer stopped writing; leave once the replies are out
+};
+
+namespace {
+std::runtime_error systemError(const std::string& what) {
+    return std::runtime_error(what + ": " + std::strerror(errno));
+}
+
+sockaddr_un socketAddress(const std::string& path) {
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    if (path.size() >= sizeof(address.sun_path)) {
+        throw std::runtime_error("control socket path too long: " + path);
+    }
+    std::memcpy(address.sun_path, path.c_str(), path.size() + 1);
+    return address;
+}
+}  // namespace
+
+ControlServer::ControlServer(std::string path, Handler handler, OversizeReply oversizeReply)
+    : _path(std::move(path)), _handler(std::move(handler)), _oversizeReply(std::move(oversizeReply)) {
+    sockaddr_un address = socketAddress(_path);
+    std::string lockPath = _path + ".lock";
+    _lockFd = ::open(lockPath.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0660);
+    if (_lockFd < 0) throw systemError("cannot create the control socket lock " + lockPath);
+    if (::flock(_lockFd, LOCK_EX | LOCK_NB) != 0) {
+        int error = errno;
+        ::close(_lockFd);
+        _lockFd = -1;
+        if (error == EWOULDBLOCK) {
+            throw std::runtime_error("another tolkatouchd is already running on " + _path);
+        }
+        errno = error;
+        throw systemError("cannot lock " + lockPath);
+    }
+    // Holding the lock, a socket file left at the path belongs to a daemon that is gone.
+    ::unlink(_path.c_str());
+
+    auto fail = [this](const std::string& what) {
+        auto error = systemError(what);
+        if (_listenFd >= 0) ::close(_listenFd);
+        if (_epollFd >= 0) ::close(_epollFd);
+        ::close(_lockFd);
+        return error;
+    };
+    _listenFd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0);
+    if (_listenFd < 0) throw fail("cannot create the control socket");
+    if (::bind(_listenFd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
+        throw fail("cannot bind the control socket " + _path);
+    }
+    if (::chmod(_path.c_str(), 0660) != 0) throw fail("cannot set the mode of " + _path);
+    if (::listen(_listenFd, 16) != 0) throw fail("cannot listen on " + _path);
+    _epollFd = ::epoll_create1(EPOLL_CLOEXEC);
+    if (_epollFd < 0) throw fail("cannot create the control socket's epoll set");
+    epoll_event event{};
+    event.events = EPOLLIN;
+    event.data.fd = _listenFd;
+    if (::epoll_ctl(_epollFd, EPOLL_CTL_ADD, _listenFd, &event) != 0) {
+        throw fail("cannot watch the control socket");
+    }
+}
+
+ControlServer::~ControlServer() {
+    for (auto& [fd, client] : _clients) ::close(fd);
+    _clients.clear();
+    ::close(_epollFd);
+    ::close(_listenFd);
+    ::unlink(_path.c_str());
+    ::close(_lockFd);
+}
+
+void ControlServer::handleReady() {
+    epoll_event events[32];
+    int count = ::epoll_wait(_epollFd, events, 32, 0);
+    for (int i = 0; i < count; ++i) {
+        int fd = events[i].data.fd;
+        if (fd == _listenFd) {
+            accept();
+            continue;
+        }
+        auto it = _clients.find(fd);
+        if (it == _clients.end()) continue;
+        Client& client = *it->second;
+        if (events[i].events & (EPOLLIN | EPOLLHUP | EPOLLERR)) readFrom(client);
+        if (_clients.count(fd) && (events[i].events & EPOLLOUT)) writeTo(client);
+    }
+}
+
+void ControlServer::accept() {
+    for (;;) {
+        int fd = ::accept4(_listenFd, nullptr, nullptr, SOCK_NONBLOCK | SOCK_CLOEXEC);
+        if (fd < 0) return;  // EAGAIN, or a client that left before we took it
+        auto client = std::make_unique<Client>();
+        client->fd = fd;
+        epoll_event event{};
+        event.events = EPOLLIN;
+        event.data.fd = fd;
+        if (::epoll_ctl(_epollFd, EPOLL_CTL_ADD, fd, &event) != 0) {
+            ::close(fd);
+            continue;
+        }
+        _clients.emplace(fd, std::move(client));
+    }
+}
+
+void ControlServer::readFrom(Client& client) {
+    char buffer[16 * 1024];
+    for (;;) {
+        ssize_t got = ::recv(client.fd, buffer, sizeof(buffer), 0);
+        if (got < 0 && errno == EINTR) continue;
+        if (got < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) break;
+        if (got <= 0) {
+            // The peer is done (or broken): a half line it leaves behind is dropped unanswered.
+            client.closing = true;
+            client.input.clear();
+            break;
+        }
+        for (ssize_t i = 0; i < got; ++i) {
+            char c = buffer[i];
+            if (c == '\n') {
+                if (client.discarding) {
+                    client.discarding = false;
+                } else {
+                    client.output += _handler(client.input);
+                    client.output += '\n';
+                }
+                client.input.clear();
+            } else if (!client.discarding) {
+                client.input += c;
+                if (client.input.size() > kMaxLineLength) {
+                    client.output += _oversizeReply();
+                    client.output += '\n';
+                    client.input.clear();
+                    client.discarding = true;
+                }
+            }
+        }
+        if (client.output.size() - client.outputOffset > kMaxPendingOutput) break;
+    }
+    int fd = client.fd;
+    writeTo(client);
+    if (!_clients.count(fd)) return;
+    if (client.closing && client.output.empty()) {
+        drop(fd);
+        return;
+    }
+    updateInterest(client);
+}
+
+void ControlServer::writeTo(Client& client) {
+    while (client.outputOffset < client.output.size()) {
+        ssize_t sent = ::send(client.fd, client.output.data() + client.outputOffset,
+                              client.output.size() - client.outputOffset, MSG_NOSIGNAL);
+        if (sent < 0 && errno == EINTR) continue;
+        if (sent < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) break;
+        if (sent < 0) {
+            drop(client.fd);
+            return;
+        }
+        client.outputOffset += static_cast<std::size_t>(sent);
+    }
+    if (client.outputOffset == client.output.size()) {
+        client.output.clear();
+        client.outputOffset = 0;
+    } else if (client.output.size() - client.outputOffset > kMaxPendingOutput) {
+        drop(client.fd);  // it asks and never reads: the daemon will not keep its replies forever
+        return;
+    }
+    if (client.closing && client.output.empty()) {
+        drop(client.fd);
+        return;
+    }
+    updateInterest(client);
+}
+
+void ControlServer::updateInterest(Client& client) {
+    bool wantsWrite = !client.output.empty();
+    if (wantsWrite == client.wantsWrite && !client.closing) return;
+    epoll_event event{};
+    // A client that has stopped writing is watched only for the room to take its replies.
+    event.events = (client.closing ? 0u : EPOLLIN) | (wantsWrite ? EPOLLOUT : 0u);
+    event.data.fd = client.fd;
+    ::epoll_ctl(_epollFd, EPOLL_CTL_MOD, client.fd, &event);
+    client.wantsWrite = wantsWrite;
+}
+
+void ControlServer::drop(int fd) {
+    ::epoll_ctl(_epollFd, EPOLL_CTL_DEL, fd, nullptr);
+    ::close(fd);
+    _clients.erase(fd);
+}
+
+}  // namespace TolkaTouch

@@ -1,0 +1,62 @@
+#pragma once
+// ControlServer: the daemon's Unix-domain control socket. Clients write one request per line and
+// read one reply per line. Everything is non-blocking behind one epoll descriptor of its own,
+// which the daemon's event loop watches: a client that connects and never writes, writes half a
+// line and leaves, or never reads its replies, costs a descriptor and a bounded buffer, and never
+// holds up the daemon. Lines longer than kMaxLineLength get an error reply.
+
+#include <cstddef>
+#include <functional>
+#include <map>
+#include <memory>
+#include <string>
+
+namespace TolkaTouch {
+
+class ControlServer {
+public:
+    static constexpr std::size_t kMaxLineLength = 64 * 1024;
+    // A client whose unread replies grow past this is disconnected.
+    static constexpr std::size_t kMaxPendingOutput = 16 * 1024 * 1024;
+
+    // Answers one request line (without its newline) with one reply line (without newline).
+    using Handler = std::function<std::string(const std::string& line)>;
+    // The reply given, without calling the handler, to a line over kMaxLineLength.
+    using OversizeReply = std::function<std::string()>;
+
+    // Takes the lock beside the socket path (PATH.lock), replaces a stale socket file, binds,
+    // sets mode 0660 and listens. Throws std::runtime_error with a one-line message when another
+    // daemon holds the socket or the socket cannot be made.
+    ControlServer(std::string path, Handler handler, OversizeReply oversizeReply);
+    ~ControlServer();  // closes every client, removes the socket file and releases the lock
+    ControlServer(const ControlServer&) = delete;
+    ControlServer& operator=(const ControlServer&) = delete;
+
+    const std::string& path() const { return _path; }
+
+    // The descriptor to watch for readability; then call handleReady().
+    int pollFd() const { return _epollFd; }
+
+    // Does all the work that is ready now without waiting: accepts, reads, answers, writes.
+    void handleReady();
+
+    std::size_t clientCount() const { return _clients.size(); }
+
+private:
+    struct Client;
+    void accept();
+    void readFrom(Client& client);
+    void writeTo(Client& client);
+    void updateInterest(Client& client);
+    void drop(int fd);
+
+    std::string _path;
+    Handler _handler;
+    OversizeReply _oversizeReply;
+    int _lockFd = -1;
+    int _listenFd = -1;
+    int _epollFd = -1;
+    std::map<int, std::unique_ptr<Client>> _clients;
+};
+
+}  // namespace TolkaTouch

@@ -1,0 +1,347 @@
+#include "daemon/Daemon.h"
+
+#include <sys/signalfd.h>
+#include <sys/timerfd.h>
+#include <systemd/sd-daemon.h>
+#include <unistd.h>
+
+#include <cerrno>
+#include <chrono>
+#include <csignal>
+#include <cstring>
+#include <stdexcept>
+
+#include "daemon/ControlServer.h"
+#include "daemon/CountingHIDDevice.h"
+#include "daemon/DeviceDiscovery.h"
+#include "daemon/EventJson.h"
+#include "daemon/KeyLogOutput.h"
+#include "daemon/KeyMapper.h"
+#include "daemon/PluginInstance.h"
+#include "daemon/PluginLibrary.h"
+#include "daemon/SimulationFeeder.h"
+#include "daemon/UinputKeyOutput.h"
+#include "platform/HIDServiceRegistry.h"
+#include "platform/HidrawDevice.h"
+#include "platform/RunLoop.h"
+#include "platform/SimulatedHIDDevice.h"
+
+namespace TolkaTouch {
+
+namespace {
+// The main thread's run loop runs only in this mode.
+const std::string kLoopMode = "tolkatouchd";
+
+std::chrono::nanoseconds monotonicNow() {
+    return std::chrono::steady_clock::now().time_since_epoch();
+}
+
+std::string hexId(uint16_t vendor, uint16_t product) {
+    char text[16];
+    std::snprintf(text, sizeof(text), "%04x:%04x", vendor, product);
+    return text;
+}
+
+std::runtime_error systemError(const std::string& what) {
+    return std::runtime_error(what + ": " + std::strerror(errno));
+}
+}  // namespace
+
+struct Daemon::Device {
+    uint32_t service = 0;
+    std::string node;
+    uint16_t vendor = 0;
+    uint16_t product = 0;
+    HIDDeviceRef handle;
+    std::unique_ptr<PluginInstance> instance;
+    std::unique_ptr<KeyMapper> keys;  // null when no keys are written
+};
+
+Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
+    : _options(std::move(options)), _printOutput(printOutput) {
+    if (!_options.keyLogPath.empty()) {
+        _keyOutput = std::make_unique<KeyLogOutput>(_options.keyLogPath);
+    } else if (!_options.noKeys) {
+        try {
+            _keyOutput = std::make_unique<UinputKeyOutput>(_options.uinputPath);
+        } catch (const std::exception& error) {
+            if (!_options.print) throw std::runtime_error(std::string(error.what()) + " (--print shows events without it)");
+            _log.log("%s; printing events only", error.what());
+        }
+    }
+
+    _plugin = std::make_unique<PluginLibrary>(_options.pluginPath);
+    if (!_options.simulatePath.empty()) {
+        _feeder = std::make_unique<SimulationFeeder>(_options.simulatePath, _options.speed);
+    }
+    _control = std::make_unique<ControlServer>(
+        _options.socketPath, [this](const std::string& line) { return answerControlRequest(line, *this); },
+        [] { return oversizedControlRequestReply(); });
+    if (_options.simulatePath.empty()) {
+        _discovery = std::make_unique<DeviceDiscovery>(_options.vendor, _options.product);
+    }
+
+    sigset_t signals;
+    sigemptyset(&signals);
+    sigaddset(&signals, SIGTERM);
+    sigaddset(&signals, SIGINT);
+    _signalFd = ::signalfd(-1, &signals, SFD_NONBLOCK | SFD_CLOEXEC);
+    if (_signalFd < 0) throw systemError("cannot take signals through a signalfd");
+    _timerFd = ::timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
+    if (_timerFd < 0) throw systemError("cannot create the key repeat timer");
+
+    _loop = RunLoop::current();
+    _eventQueue = DispatchQueue::create("tolkatouchd.events");
+}
+
+Daemon::~Daemon() {
+    stopFeeder();
+    for (auto& [service, device] : _devices) {
+        if (device->keys) device->keys->releaseAll();
+        device->instance->shutdown();
+        HIDServiceRegistry::unregisterService(service);
+    }
+    _devices.clear();
+    if (_eventQueue) _eventQueue->sync([] {});
+    if (_signalFd >= 0) ::close(_signalFd);
+    if (_timerFd >= 0) ::close(_timerFd);
+}
+
+int Daemon::run() {
+    addSources();
+    startDevices();
+    sd_notify(0, "READY=1");
+    while (_running) {
+        _loop->runInMode(kLoopMode, RunLoop::kInfinite, true);
+        armRepeatTimer();
+    }
+    sd_notify(0, "STOPPING=1");
+    return 0;
+}
+
+void Daemon::addSources() {
+    _loop->addSource(_signalFd, kLoopMode, [this] { handleSignal(); });
+    _loop->addSource(_timerFd, kLoopMode, [this] { handleRepeatTimer(); });
+    _loop->addSource(_control->pollFd(), kLoopMode, [this] { _control->handleReady(); });
+    if (_discovery) {
+        _loop->addSource(_discovery->pollFd(), kLoopMode, [this] {
+            _discovery->handleReady([this](const HidrawNode& node) { addHidrawNode(node); },
+                                    [this](const std::string& devnode) { removeDeviceNode(devnode); });
+        });
+    }
+}
+
+void Daemon::startDevices() {
+    if (_discovery) {
+        auto nodes = _discovery->enumerate();
+        if (nodes.empty()) {
+            _log.log("waiting for a surface %s", hexId(_options.vendor, _options.product).c_str());
+        }
+        for (const auto& node : nodes) addHidrawNode(node);
+        return;
+    }
+
+    PropertyValue::Dictionary properties;
+    properties.emplace("VendorID", PropertyValue(static_cast<unsigned>(_options.vendor)));
+    properties.emplace("ProductID", PropertyValue(static_cast<unsigned>(_options.product)));
+    properties.emplace("Transport", PropertyValue("Virtual"));
+    _simulated = SimulatedHIDDevice::create(std::move(properties));
+    if (!_simulated) throw std::runtime_error("cannot create the simulated device");
+    _simulatedCounter = std::make_shared<CountingHIDDevice>(_simulated);
+    addDevice("simulated:" + _options.simulatePath, _options.vendor, _options.product, _simulatedCounter);
+    if (_devices.empty()) throw std::runtime_error("the plug-in did not take the simulated device");
+
+    // The feeder stops before the instance goes (shutdown), or the instance goes only after the
+    // feeder has finished (end of the document), so the feeder may hold on to it.
+    PluginInstance* instance = _devices.begin()->second->instance.get();
+    SimulationFeeder::Target target;
+    target.writeReport = [this](const uint8_t* bytes, size_t length) {
+        if (_simulated->writeInputReport(bytes, length)) ++_simulatedWritten;
+    };
+    target.applySetting = [this, instance](const std::string& key, const PropertyValue& value) {
+        // A recorded setting follows the reports before it, as it did when it was recorded.
+        _simulatedCounter->waitForDelivered(_simulatedWritten, [this] { return _feeder->stopRequested(); });
+        if (_feeder->stopRequested()) return;
+        instance->setProperty("Pipeline." + key, value);
+    };
+    target.finished = [this] { _simulated->simulateRemoval(); };
+    _feeder->start(std::move(target));
+}
+
+void Daemon::addHidrawNode(const HidrawNode& node) {
+    if (_shuttingDown) return;
+    for (const auto& [service, device] : _devices) {
+        if (device->node == node.devnode) return;  // reported by both the monitor and the enumeration
+    }
+    uint32_t result = 0;
+    auto handle = HidrawDevice::create(node.devnode, &result);
+    if (!handle) {
+        const char* reason = result == HIDResult::NotPrivileged ? "permission denied"
+                             : result == HIDResult::NoDevice    ? "no such device"
+                                                                : "not usable";
+        _log.error("cannot open %s: %s (0x%08x)", node.devnode.c_str(), reason, result);
+        return;
+    }
+    addDevice(node.devnode, node.vendor, node.product, std::move(handle));
+}
+
+void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDDeviceRef handle) {
+    uint32_t service = _nextService++;
+    // The service's start asks the registry for its device: it gets the handle opened here.
+    HIDServiceRegistry::registerService(service, [handle] { return handle; });
+    // Runs on the service's input report thread, which must not tear itself down: hand over.
+    handle->setRemovalHandler([this, service] {
+        _loop->performBlock(kLoopMode, [this, service] { removeDevice(service, "the device went away"); });
+    });
+
+    PropertyValue::Dictionary matching;
+    matching.emplace("VendorID", PropertyValue(static_cast<unsigned>(vendor)));
+    matching.emplace("ProductID", PropertyValue(static_cast<unsigned>(product)));
+    PluginInstance::EventCallback callback{&Daemon::eventCallback, this,
+                                           reinterpret_cast<void*>(static_cast<uintptr_t>(service))};
+    auto device = std::make_unique<Device>();
+    try {
+        device->instance = std::make_unique<PluginInstance>(*_plugin, service, PropertyValue(std::move(matching)),
+                                                            callback, _eventQueue);
+    } catch (const std::exception& error) {
+        HIDServiceRegistry::unregisterService(service);
+        _log.error("cannot serve %s: %s", node.c_str(), error.what());
+        return;
+    }
+    device->service = service;
+    device->node = std::move(node);
+    device->vendor = vendor;
+    device->product = product;
+    device->handle = std::move(handle);
+    if (_keyOutput) device->keys = std::make_unique<KeyMapper>(*_keyOutput, monotonicNow);
+    _log.log("serving %s (%s) as service %u", device->node.c_str(), hexId(vendor, product).c_str(), service);
+    _devices.emplace(service, std::move(device));
+}
+
+void Daemon::removeDevice(uint32_t service, const char* reason) {
+    auto it = _devices.find(service);
+    if (it == _devices.end()) return;
+    Device& device = *it->second;
+    // A pulled cable must not leave a key down: let go before anything else.
+    if (device.keys) device.keys->releaseAll();
+    device.instance->shutdown();
+    HIDServiceRegistry::unregisterService(service);
+    _log.log("stopped serving %s (service %u): %s", device.node.c_str(), service, reason);
+    _devices.erase(it);
+    // Events the service queued before it stopped still reach the run loop (to be printed); the
+    // device's keys are gone, so none of them can press a key again.
+    _eventQueue->sync([] {});
+    if (_simulated && _devices.empty()) {
+        // A simulated surface does not come back: the daemon's work is done.
+        beginShutdown();
+    }
+}
+
+void Daemon::removeDeviceNode(const std::string& devnode) {
+    for (const auto& [service, device] : _devices) {
+        if (device->node == devnode) {
+            removeDevice(service, "the device was removed");
+            return;
+        }
+    }
+}
+
+void Daemon::eventCallback(void* target, void* refcon, void*, const HIDEventRef& event, uint32_t) {
+    auto* self = static_cast<Daemon*>(target);
+    auto service = static_cast<uint32_t>(reinterpret_cast<uintptr_t>(refcon));
+    self->_loop->performBlock(kLoopMode, [self, service, event] { self->handleEvent(service, *event); });
+}
+
+void Daemon::handleEvent(uint32_t service, const HIDEvent& event) {
+    if (_options.print) {
+        std::string line = eventJsonLine(event);
+        line += '\n';
+        std::fwrite(line.data(), 1, line.size(), _printOutput);
+        std::fflush(_printOutput);
+    }
+    auto it = _devices.find(service);
+    if (it != _devices.end() && it->second->keys) it->second->keys->handleEvent(event);
+}
+
+void Daemon::handleSignal() {
+    signalfd_siginfo info;
+    bool stop = false;
+    while (::read(_signalFd, &info, sizeof(info)) == static_cast<ssize_t>(sizeof(info))) {
+        _log.log("stopping on %s", info.ssi_signo == SIGINT ? "SIGINT" : "SIGTERM");
+        stop = true;
+    }
+    if (stop) beginShutdown();
+}
+
+void Daemon::handleRepeatTimer() {
+    uint64_t expirations;
+    [[maybe_unused]] ssize_t got = ::read(_timerFd, &expirations, sizeof(expirations));
+    for (auto& [service, device] : _devices) {
+        if (device->keys) device->keys->repeatDue();
+    }
+}
+
+void Daemon::armRepeatTimer() {
+    std::optional<std::chrono::nanoseconds> next;
+    for (const auto& [service, device] : _devices) {
+        if (!device->keys) continue;
+        auto due = device->keys->nextRepeatTime();
+        if (due && (!next || *due < *next)) next = due;
+    }
+    itimerspec spec{};
+    if (next) {
+        // Zero would disarm the timer: a time already past is given as one nanosecond.
+        auto count = std::max<int64_t>(next->count(), 1);
+        spec.it_value.tv_sec = static_cast<time_t>(count / 1'000'000'000);
+        spec.it_value.tv_nsec = static_cast<long>(count % 1'000'000'000);
+    }
+    ::timerfd_settime(_timerFd, TFD_TIMER_ABSTIME, &spec, nullptr);
+}
+
+void Daemon::beginShutdown() {
+    if (_shuttingDown) return;
+    _shuttingDown = true;
+    stopFeeder();
+    while (!_devices.empty()) removeDevice(_devices.begin()->first, "the daemon is stopping");
+    _eventQueue->sync([] {});
+    // After the events already handed over (they are blocks queued before this one).
+    _loop->performBlock(kLoopMode, [this] { _running = false; });
+}
+
+void Daemon::stopFeeder() {
+    if (!_feeder) return;
+    _feeder->requestStop();
+    // A recorded setting may be waiting for reports that will not be handled any more.
+    if (_simulatedCounter) _simulatedCounter->wakeWaiters();
+    _feeder->stop();
+}
+
+Daemon::Device* Daemon::findDevice(std::optional<uint32_t> service) {
+    if (_devices.empty()) return nullptr;
+    if (!service) return _devices.begin()->second.get();
+    auto it = _devices.find(*service);
+    return it == _devices.end() ? nullptr : it->second.get();
+}
+
+std::vector<ControlDeviceInfo> Daemon::devices() {
+    std::vector<ControlDeviceInfo> list;
+    for (const auto& [service, device] : _devices) {
+        list.push_back({service, device->node, device->vendor, device->product});
+    }
+    return list;
+}
+
+std::optional<PropertyValue> Daemon::getProperty(std::optional<uint32_t> service, const std::string& key) {
+    Device* device = findDevice(service);
+    if (!device) return std::nullopt;
+    return device->instance->copyProperty(key);
+}
+
+std::optional<bool> Daemon::setProperty(std::optional<uint32_t> service, const std::string& key,
+                                        const PropertyValue& value) {
+    Device* device = findDevice(service);
+    if (!device) return std::nullopt;
+    return device->instance->setProperty(key, value);
+}
+
+}  // namespace TolkaTouch

@@ -1,0 +1,122 @@
+// tolkatouchd: runs the TolkaTouch HID service plug-in for each connected surface and turns its
+// gestures into media keys.
+
+#include <CLI/CLI.hpp>
+
+#include <pthread.h>
+
+#include <csignal>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+
+#include "daemon/Daemon.h"
+#include "platform/Log.h"
+
+#ifndef TOLKA_DEFAULT_PLUGIN_PATH
+#define TOLKA_DEFAULT_PLUGIN_PATH "/usr/local/lib/tolkatouch/tolkatouch-hidservice.so"
+#endif
+
+namespace {
+
+// The service's runtime directory when systemd gives one, else the conventional place.
+std::string defaultSocketPath() {
+    std::string directory = "/run/tolkatouch";
+    if (const char* runtime = std::getenv("RUNTIME_DIRECTORY"); runtime && *runtime) {
+        directory = runtime;
+        directory = directory.substr(0, directory.find(':'));  // the first of several
+    }
+    return directory + "/tolkatouchd.sock";
+}
+
+std::string hexId(uint16_t id) {
+    char text[8];
+    std::snprintf(text, sizeof(text), "%04x", id);
+    return text;
+}
+
+// A USB ID written as lsusb writes it ("1209"), with or without "0x".
+std::string parseUsbId(const std::string& text, uint16_t& id) {
+    std::string digits = text.rfind("0x", 0) == 0 || text.rfind("0X", 0) == 0 ? text.substr(2) : text;
+    if (digits.empty() || digits.size() > 4 || digits.find_first_not_of("0123456789abcdefABCDEF") != std::string::npos) {
+        return "expected a hexadecimal ID of at most four digits, got \"" + text + "\"";
+    }
+    id = static_cast<uint16_t>(std::stoul(digits, nullptr, 16));
+    return {};
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    // Before any thread exists, so that every thread inherits the mask and the signals reach
+    // only the daemon's signalfd.
+    sigset_t signals;
+    sigemptyset(&signals);
+    sigaddset(&signals, SIGTERM);
+    sigaddset(&signals, SIGINT);
+    pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+    std::signal(SIGPIPE, SIG_IGN);
+
+    TolkaTouch::DaemonOptions options;
+    options.pluginPath = TOLKA_DEFAULT_PLUGIN_PATH;
+    options.socketPath = defaultSocketPath();
+    std::string vendor = hexId(TolkaTouch::SurfaceIds::kDefaultVendorId);
+    std::string product = hexId(TolkaTouch::SurfaceIds::kDefaultProductId);
+    bool debug = false;
+
+    CLI::App app{"tolkatouchd: turns the TolkaTouch surface's gestures into media keys.\n"
+                 "Taps: region 1 play/pause, region 2 volume down, region 3 volume up. Holds: region 1\n"
+                 "voice command, regions 2 and 3 repeat their volume key every 150 ms."};
+    app.add_option("--vendor", vendor, "USB vendor ID of the surface, hexadecimal")
+        ->type_name("HEX")
+        ->capture_default_str();
+    app.add_option("--product", product, "USB product ID of the surface, hexadecimal")
+        ->type_name("HEX")
+        ->capture_default_str();
+    app.add_option("--plugin", options.pluginPath, "the HID service plug-in library")
+        ->type_name("PATH")
+        ->capture_default_str();
+    app.add_option("--socket", options.socketPath, "the control socket")->type_name("PATH")->capture_default_str();
+    app.add_flag("--print", options.print,
+                 "print each event as a JSON line on standard output; keys are still written when the "
+                 "virtual keyboard can be made");
+    app.add_flag("--no-keys", options.noKeys, "write no keys (with --print: print only)");
+    app.add_option("--key-log", options.keyLogPath,
+                   "write key events as text lines to FILE instead of the virtual keyboard")
+        ->type_name("FILE");
+    app.add_option("--uinput", options.uinputPath, "the uinput node")->type_name("PATH")->capture_default_str();
+    app.add_option("--simulate", options.simulatePath,
+                   "play a recording DOCUMENT as the device, at its recorded pace, instead of looking "
+                   "for surfaces; the daemon stops when the document ends")
+        ->type_name("DOCUMENT");
+    app.add_option("--speed", options.speed, "pace of --simulate: 2 plays twice as fast")
+        ->type_name("X")
+        ->capture_default_str()
+        ->check(CLI::PositiveNumber);
+    app.add_flag("--debug", debug, "log at debug level");
+    CLI11_PARSE(app, argc, argv);
+
+    if (auto error = parseUsbId(vendor, options.vendor); !error.empty()) {
+        std::fprintf(stderr, "tolkatouchd: --vendor: %s\n", error.c_str());
+        return 1;
+    }
+    if (auto error = parseUsbId(product, options.product); !error.empty()) {
+        std::fprintf(stderr, "tolkatouchd: --product: %s\n", error.c_str());
+        return 1;
+    }
+    if (debug) TolkaTouch::SystemLog::setDebugEnabled(true);
+
+    int status = 0;
+    try {
+        TolkaTouch::Daemon daemon(options, stdout);
+        status = daemon.run();
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "tolkatouchd: %s\n", error.what());
+        status = 1;
+    }
+    // Everything of the daemon is torn down by now, but a plug-in's report thread may still be
+    // writing its last log line after it let its service go: leave without destroying the
+    // process's static objects under it.
+    std::fflush(nullptr);
+    std::_Exit(status);
+}

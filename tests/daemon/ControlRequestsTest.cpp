@@ -1,0 +1,108 @@
+#include "daemon/ControlRequests.h"
+
+#include <gtest/gtest.h>
+
+#include <map>
+
+namespace TolkaTouch {
+namespace {
+
+class FakeTarget : public ControlTarget {
+public:
+    std::vector<ControlDeviceInfo> devices() override { return list; }
+    std::optional<PropertyValue> getProperty(std::optional<uint32_t> service, const std::string& key) override {
+        asked.push_back({service, key});
+        if (list.empty() || (service && *service != list.front().service)) return std::nullopt;
+        auto it = properties.find(key);
+        return it == properties.end() ? PropertyValue() : it->second;
+    }
+    std::optional<bool> setProperty(std::optional<uint32_t> service, const std::string& key,
+                                    const PropertyValue& value) override {
+        if (list.empty() || (service && *service != list.front().service)) return std::nullopt;
+        properties[key] = value;
+        return key != "Refused";
+    }
+
+    std::vector<ControlDeviceInfo> list{{1, "/dev/hidraw4", 0x1209, 0x0001}};
+    std::map<std::string, PropertyValue> properties;
+    std::vector<std::pair<std::optional<uint32_t>, std::string>> asked;
+};
+
+TEST(ControlRequestsTest, GetAnswersTheServicesValue) {
+    FakeTarget target;
+    target.properties["Version"] = PropertyValue(PropertyValue::Array{28, 0, 0});
+    EXPECT_EQ(answerControlRequest(R"({"get": "Version"})", target), R"({"value":[28,0,0]})");
+}
+
+TEST(ControlRequestsTest, GetOfAKeyNobodyAnswersIsNull) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"get": "Nothing"})", target), R"({"value":null})");
+}
+
+TEST(ControlRequestsTest, GetGoesToTheNamedDevice) {
+    FakeTarget target;
+    answerControlRequest(R"({"get": "Version", "device": 1})", target);
+    ASSERT_EQ(target.asked.size(), 1u);
+    EXPECT_EQ(target.asked[0].first, 1u);
+    EXPECT_EQ(answerControlRequest(R"({"get": "Version", "device": 7})", target),
+              R"({"error":"no device with service 7"})");
+}
+
+TEST(ControlRequestsTest, GetWithoutAnyDeviceIsAnError) {
+    FakeTarget target;
+    target.list.clear();
+    EXPECT_EQ(answerControlRequest(R"({"get": "Version"})", target), R"({"error":"no device"})");
+}
+
+TEST(ControlRequestsTest, SetPassesTheValueAndAnswersTheServicesResult) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"set": "Pipeline.Algs.HoldTimeoutMilliseconds", "value": 400})", target),
+              R"({"ok":true})");
+    EXPECT_EQ(target.properties["Pipeline.Algs.HoldTimeoutMilliseconds"], PropertyValue(400u));
+    EXPECT_EQ(answerControlRequest(R"({"set": "Refused", "value": "x"})", target), R"({"ok":false})");
+}
+
+TEST(ControlRequestsTest, DevicesListsServiceNodeAndIds) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"devices": true})", target),
+              R"({"devices":[{"node":"/dev/hidraw4","product":1,"service":1,"vendor":4617}]})");
+}
+
+TEST(ControlRequestsTest, TextThatIsNotAJsonObjectIsMalformed) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest("get Version", target), R"({"error":"malformed request"})");
+    EXPECT_EQ(answerControlRequest(R"(["get", "Version"])", target), R"({"error":"malformed request"})");
+    EXPECT_EQ(answerControlRequest(R"({"get": "Version"} trailing)", target), R"({"error":"malformed request"})");
+    EXPECT_EQ(answerControlRequest("", target), R"({"error":"malformed request"})");
+    EXPECT_EQ(answerControlRequest("{\"get\": \"\xff\"}", target), R"({"error":"malformed request"})");
+}
+
+TEST(ControlRequestsTest, DeeplyNestedValueIsMalformed) {
+    FakeTarget target;
+    std::string deep = R"({"set": "Key", "value": )" + std::string(30000, '[') + std::string(30000, ']') + "}";
+    EXPECT_EQ(answerControlRequest(deep, target), R"({"error":"malformed request"})");
+    EXPECT_TRUE(target.properties.empty());
+}
+
+TEST(ControlRequestsTest, WrongMemberTypesAreMalformed) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"get": 5})", target),
+              R"({"error":"malformed request: \"get\" takes a key string"})");
+    EXPECT_EQ(answerControlRequest(R"({"set": "Key"})", target),
+              R"({"error":"malformed request: \"set\" takes a key string and a \"value\""})");
+    EXPECT_EQ(answerControlRequest(R"({"get": "Version", "device": -1})", target),
+              R"({"error":"malformed request: \"device\" takes a service number"})");
+}
+
+TEST(ControlRequestsTest, AnObjectWithoutAKnownRequestIsUnknown) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"reboot": true})", target), R"({"error":"unknown request"})");
+    EXPECT_EQ(answerControlRequest(R"({"devices": false})", target), R"({"error":"unknown request"})");
+}
+
+TEST(ControlRequestsTest, OversizedReplyNamesTheLimit) {
+    EXPECT_EQ(oversizedControlRequestReply(), R"j({"error":"request too long (over 65536 bytes)"})j");
+}
+
+}  // namespace
+}  // namespace TolkaTouch

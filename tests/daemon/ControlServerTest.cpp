@@ -1,0 +1,195 @@
+#include "daemon/ControlServer.h"
+
+#include <gtest/gtest.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <sys/stat.h>
+#include <sys/un.h>
+#include <unistd.h>
+
+#include <chrono>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <stdexcept>
+
+namespace TolkaTouch {
+namespace {
+
+class ControlServerTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        char pattern[] = "/tmp/tolkatouchd-control-XXXXXX";
+        directory = ::mkdtemp(pattern);
+        path = directory + "/control.sock";
+    }
+    void TearDown() override {
+        for (int fd : clients) ::close(fd);
+        server.reset();
+        std::filesystem::remove_all(directory);
+    }
+
+    void startServer() {
+        server = std::make_unique<ControlServer>(
+            path,
+            [this](const std::string& line) {
+                handled.push_back(line);
+                return "reply:" + line;
+            },
+            [] { return std::string("too long"); });
+    }
+
+    int connectClient() {
+        int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        std::strcpy(address.sun_path, path.c_str());
+        if (::connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
+            throw std::runtime_error("connect failed");
+        }
+        clients.push_back(fd);
+        return fd;
+    }
+
+    void send(int fd, const std::string& text) {
+        ASSERT_EQ(::send(fd, text.data(), text.size(), MSG_NOSIGNAL), static_cast<ssize_t>(text.size()));
+    }
+
+    // Serves until `fd` has `lines` complete lines to read (or two seconds pass), then reads them.
+    std::string receiveLines(int fd, size_t lines) {
+        std::string text;
+        auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(2);
+        while (static_cast<size_t>(std::count(text.begin(), text.end(), '\n')) < lines &&
+               std::chrono::steady_clock::now() < deadline) {
+            serveFor(10);
+            char buffer[4096];
+            ssize_t got = ::recv(fd, buffer, sizeof(buffer), MSG_DONTWAIT);
+            if (got > 0) text.append(buffer, static_cast<size_t>(got));
+        }
+        return text;
+    }
+
+    void serveFor(int milliseconds) {
+        pollfd ready{server->pollFd(), POLLIN, 0};
+        if (::poll(&ready, 1, milliseconds) > 0) server->handleReady();
+    }
+
+    std::string directory;
+    std::string path;
+    std::unique_ptr<ControlServer> server;
+    std::vector<std::string> handled;
+    std::vector<int> clients;
+};
+
+TEST_F(ControlServerTest, EachLineGetsTheHandlersReplyOnItsOwnLine) {
+    startServer();
+    int client = connectClient();
+    send(client, "first\nsecond\n");
+    EXPECT_EQ(receiveLines(client, 2), "reply:first\nreply:second\n");
+}
+
+TEST_F(ControlServerTest, LineSplitAcrossWritesIsAnsweredOnceComplete) {
+    startServer();
+    int client = connectClient();
+    send(client, "hal");
+    serveFor(50);
+    EXPECT_TRUE(handled.empty());
+    send(client, "f\n");
+    EXPECT_EQ(receiveLines(client, 1), "reply:half\n");
+}
+
+TEST_F(ControlServerTest, OversizedLineGetsTheErrorReplyAndTheNextLineIsServed) {
+    startServer();
+    int client = connectClient();
+    std::string huge(ControlServer::kMaxLineLength + 10, 'x');
+    std::thread writer([&] { send(client, huge + "\nnext\n"); });
+    std::string replies = receiveLines(client, 2);
+    writer.join();
+    EXPECT_EQ(replies, "too long\nreply:next\n");
+    EXPECT_EQ(handled, (std::vector<std::string>{"next"}));
+}
+
+TEST_F(ControlServerTest, LineOfExactlyTheLimitIsServed) {
+    startServer();
+    int client = connectClient();
+    std::string line(ControlServer::kMaxLineLength, 'y');
+    std::thread writer([&] { send(client, line + "\n"); });
+    std::string replies = receiveLines(client, 1);
+    writer.join();
+    EXPECT_EQ(replies, "reply:" + line + "\n");
+}
+
+TEST_F(ControlServerTest, SilentClientDoesNotHoldUpAnother) {
+    startServer();
+    connectClient();  // connects and never writes
+    int talker = connectClient();
+    send(talker, "hello\n");
+    EXPECT_EQ(receiveLines(talker, 1), "reply:hello\n");
+}
+
+TEST_F(ControlServerTest, ClientLeavingMidLineIsDroppedUnanswered) {
+    startServer();
+    int client = connectClient();
+    send(client, "unfinished");
+    serveFor(50);
+    EXPECT_EQ(server->clientCount(), 1u);
+    ::close(client);
+    clients.clear();
+    for (int i = 0; i < 20 && server->clientCount() > 0; ++i) serveFor(10);
+    EXPECT_EQ(server->clientCount(), 0u);
+    EXPECT_TRUE(handled.empty());
+}
+
+TEST_F(ControlServerTest, ClientThatSendsAndLeavesStillHasItsLineAnswered) {
+    startServer();
+    int client = connectClient();
+    send(client, "bye\n");
+    ::shutdown(client, SHUT_WR);
+    EXPECT_EQ(receiveLines(client, 1), "reply:bye\n");
+}
+
+TEST_F(ControlServerTest, SecondServerOnTheSameSocketRefusesWithAClearMessage) {
+    startServer();
+    try {
+        ControlServer second(path, [](const std::string&) { return std::string(); }, [] { return std::string(); });
+        FAIL() << "a second server started";
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()), "another tolkatouchd is already running on " + path);
+    }
+    int client = connectClient();  // the first one still serves
+    send(client, "still\n");
+    EXPECT_EQ(receiveLines(client, 1), "reply:still\n");
+}
+
+TEST_F(ControlServerTest, StaleSocketFileOfAGoneDaemonIsReplaced) {
+    int stale = ::socket(AF_UNIX, SOCK_STREAM, 0);
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    std::strcpy(address.sun_path, path.c_str());
+    ASSERT_EQ(::bind(stale, reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
+    ::close(stale);
+    startServer();
+    int client = connectClient();
+    send(client, "fresh\n");
+    EXPECT_EQ(receiveLines(client, 1), "reply:fresh\n");
+}
+
+TEST_F(ControlServerTest, SocketHasMode0660AndGoesWithTheServer) {
+    startServer();
+    struct stat info {};
+    ASSERT_EQ(::stat(path.c_str(), &info), 0);
+    EXPECT_TRUE(S_ISSOCK(info.st_mode));
+    EXPECT_EQ(info.st_mode & 0777, 0660u);
+    server.reset();
+    EXPECT_FALSE(std::filesystem::exists(path));
+}
+
+TEST_F(ControlServerTest, SocketPathTooLongIsRefused) {
+    std::string longPath = directory + "/" + std::string(200, 'p');
+    EXPECT_THROW(ControlServer(longPath, [](const std::string&) { return std::string(); },
+                               [] { return std::string(); }),
+                 std::runtime_error);
+}
+
+}  // namespace
+}  // namespace TolkaTouch

@@ -1,0 +1,322 @@
+// tolkatouchd end to end: the daemon binary with the plug-in library, fed by recording documents
+// through --simulate, observed through --print, --key-log and the control socket.
+
+#include <gtest/gtest.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <sys/un.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstring>
+#include <filesystem>
+#include <nlohmann/json.hpp>
+#include <string>
+#include <thread>
+#include <vector>
+
+#include "tests/daemon/Subprocess.h"
+
+namespace TolkaTouch {
+namespace {
+
+namespace fs = std::filesystem;
+using namespace std::chrono_literals;
+using Testing::runToCompletion;
+using Testing::Subprocess;
+
+std::vector<std::string> lines(const std::string& text) {
+    std::vector<std::string> result;
+    size_t start = 0;
+    while (start < text.size()) {
+        size_t end = text.find('\n', start);
+        if (end == std::string::npos) end = text.size();
+        result.push_back(text.substr(start, end - start));
+        start = end + 1;
+    }
+    return result;
+}
+
+// Event lines without their time stamps, which differ from run to run.
+std::vector<std::string> withoutTimestamps(const std::string& text) {
+    std::vector<std::string> result;
+    for (const auto& line : lines(text)) {
+        auto event = nlohmann::ordered_json::parse(line);
+        event.erase("timestamp");
+        result.push_back(event.dump());
+    }
+    return result;
+}
+
+class DaemonEndToEndTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        char pattern[] = "/tmp/tolkatouchd-e2e-XXXXXX";
+        directory = ::mkdtemp(pattern);
+        socket = directory + "/tolkatouchd.sock";
+    }
+    void TearDown() override { fs::remove_all(directory); }
+
+    std::string file(const std::string& name) const { return directory + "/" + name; }
+
+    // A recording document made from one of the gesture scripts beside the tests.
+    std::string synthesize(const std::string& script) {
+        std::string document = file(script + ".json");
+        int status = runToCompletion({TOLKATOUCH_PATH, "synth", std::string(TOLKA_TEST_DATA_DIR) + "/" + script,
+                                      "-o", document},
+                                     file("synth.out"), file("synth.err"));
+        EXPECT_EQ(status, 0) << Testing::readWholeFile(file("synth.err"));
+        return document;
+    }
+
+    std::vector<std::string> daemonArguments(const std::string& document, std::vector<std::string> extra) const {
+        std::vector<std::string> arguments{TOLKATOUCHD_PATH, "--plugin", TOLKA_PLUGIN_PATH, "--socket", socket,
+                                           "--simulate", document};
+        arguments.insert(arguments.end(), extra.begin(), extra.end());
+        return arguments;
+    }
+
+    std::unique_ptr<Subprocess> startDaemon(const std::string& document, std::vector<std::string> extra,
+                                            const std::string& name = "daemon") {
+        return std::make_unique<Subprocess>(daemonArguments(document, std::move(extra)), file(name + ".out"),
+                                            file(name + ".err"));
+    }
+
+    // Connects to the control socket, waiting for the daemon to open it.
+    int connectControl() {
+        auto deadline = std::chrono::steady_clock::now() + 10s;
+        while (std::chrono::steady_clock::now() < deadline) {
+            int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+            sockaddr_un address{};
+            address.sun_family = AF_UNIX;
+            std::strcpy(address.sun_path, socket.c_str());
+            if (::connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) == 0) return fd;
+            ::close(fd);
+            std::this_thread::sleep_for(10ms);
+        }
+        ADD_FAILURE() << "the control socket never opened";
+        return -1;
+    }
+
+    // One request line out, one reply line back.
+    static std::string exchange(int fd, const std::string& request) {
+        ::send(fd, request.data(), request.size(), MSG_NOSIGNAL);
+        std::string reply;
+        auto deadline = std::chrono::steady_clock::now() + 10s;
+        while (reply.find('\n') == std::string::npos && std::chrono::steady_clock::now() < deadline) {
+            pollfd ready{fd, POLLIN, 0};
+            if (::poll(&ready, 1, 100) <= 0) continue;
+            char buffer[4096];
+            ssize_t got = ::recv(fd, buffer, sizeof(buffer), 0);
+            if (got <= 0) break;
+            reply.append(buffer, static_cast<size_t>(got));
+        }
+        return reply;
+    }
+
+    // Runs the tolkatouch tool against the daemon's socket; answers its status, output in *out.
+    int tool(std::vector<std::string> arguments, std::string* out = nullptr, std::string* err = nullptr) {
+        arguments.insert(arguments.begin(), TOLKATOUCH_PATH);
+        arguments.push_back("--socket");
+        arguments.push_back(socket);
+        int status = runToCompletion(arguments, file("tool.out"), file("tool.err"), 30s);
+        if (out) *out = Testing::readWholeFile(file("tool.out"));
+        if (err) *err = Testing::readWholeFile(file("tool.err"));
+        return status;
+    }
+
+    std::string directory;
+    std::string socket;
+};
+
+void expectDaemonPrintsWhatReplayPrints(DaemonEndToEndTest& test, const std::string& document,
+                                        const std::string& outputDirectory) {
+    SCOPED_TRACE(document);
+    int replayStatus = runToCompletion({TOLKATOUCH_PATH, "replay", "--json", "--fast", document},
+                                       outputDirectory + "/replay.out", outputDirectory + "/replay.err");
+    ASSERT_EQ(replayStatus, 0) << Testing::readWholeFile(outputDirectory + "/replay.err");
+    auto expected = withoutTimestamps(Testing::readWholeFile(outputDirectory + "/replay.out"));
+
+    Subprocess daemon({TOLKATOUCHD_PATH, "--plugin", TOLKA_PLUGIN_PATH, "--socket", outputDirectory + "/d.sock",
+                       "--simulate", document, "--speed", "25", "--print", "--no-keys"},
+                      outputDirectory + "/daemon.out", outputDirectory + "/daemon.err");
+    auto status = daemon.wait(120s);
+    ASSERT_EQ(status, 0) << daemon.standardError().substr(0, 2000);
+    EXPECT_EQ(withoutTimestamps(daemon.standardOutput()), expected);
+    (void)test;
+}
+
+TEST_F(DaemonEndToEndTest, EveryExampleRecordingYieldsExactlyTheEventsOfTheReplayTool) {
+    std::vector<std::string> documents;
+    for (const auto& entry : fs::directory_iterator(TOLKA_EXAMPLES_DIR)) {
+        if (entry.path().extension() == ".json") documents.push_back(entry.path());
+    }
+    std::sort(documents.begin(), documents.end());
+    for (const auto& script : {"everyday.gestures", "long-hold.gestures", "steady-flow.gestures"}) {
+        documents.push_back(synthesize(script));
+    }
+    for (const auto& document : documents) expectDaemonPrintsWhatReplayPrints(*this, document, directory);
+}
+
+TEST_F(DaemonEndToEndTest, PropertiesCanBeReadAndWrittenWhileReportsFlow) {
+    auto daemon = startDaemon(synthesize("steady-flow.gestures"), {"--no-keys"});
+    ::close(connectControl());
+
+    std::string out, err;
+    ASSERT_EQ(tool({"prop", "get", "Version"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "[28,0,0]\n");
+    ASSERT_EQ(tool({"prop", "set", "Pipeline.Algs.HoldTimeoutMilliseconds", "700"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "");
+    ASSERT_EQ(tool({"prop", "get", "Pipeline.Algs.HoldTimeoutMilliseconds"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "700\n");
+    ASSERT_EQ(tool({"devices"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "service 1  1209:0001  simulated:" + file("steady-flow.gestures.json") + "\n");
+
+    // The recording, fetched and saved, is a document the replay tool plays; it holds the setting.
+    ASSERT_EQ(tool({"prop", "get", "Recording"}, &out, &err), 0) << err;
+    Testing::readWholeFile(file("tool.out"));
+    fs::copy_file(file("tool.out"), file("fetched.json"));
+    auto fetched = nlohmann::json::parse(out);
+    bool hasSetting = false;
+    size_t reports = 0;
+    for (const auto& frame : fetched["Frames"]) {
+        if (frame["Type"] == "State" && frame["Key"] == "Algs.HoldTimeoutMilliseconds" && frame["Value"] == 700) {
+            hasSetting = true;
+        }
+        if (frame["Type"] == "InputReport") ++reports;
+    }
+    EXPECT_TRUE(hasSetting);
+    EXPECT_GT(reports, 0u);
+    int replayStatus = runToCompletion({TOLKATOUCH_PATH, "replay", "--json", "--fast", file("fetched.json")},
+                                       file("replay.out"), file("replay.err"));
+    EXPECT_EQ(replayStatus, 0) << Testing::readWholeFile(file("replay.err"));
+
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, UnknownPropertyReadsNullAndToolReportsDaemonErrors) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    std::string out, err;
+    ASSERT_EQ(tool({"prop", "get", "NoSuchKey"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "null\n");
+    EXPECT_EQ(tool({"prop", "get", "Version", "--device", "9"}, &out, &err), 1);
+    EXPECT_EQ(err, "tolkatouch: Version: no device with service 9\n");
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, SigtermInTheMiddleOfAHoldExitsWithinOneSecondWithTheKeyReleased) {
+    std::string keyLog = file("keys.log");
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--key-log", keyLog});
+    auto deadline = std::chrono::steady_clock::now() + 20s;
+    while (Testing::readWholeFile(keyLog).find("KEY_VOLUMEUP 1") == std::string::npos &&
+           std::chrono::steady_clock::now() < deadline) {
+        std::this_thread::sleep_for(5ms);
+    }
+    ASSERT_NE(Testing::readWholeFile(keyLog).find("KEY_VOLUMEUP 1"), std::string::npos) << daemon->standardError();
+
+    daemon->signal(SIGTERM);
+    auto status = daemon->wait(1000ms);
+    ASSERT_TRUE(status) << "still running one second after SIGTERM";
+    EXPECT_EQ(*status, 0);
+    auto writes = lines(Testing::readWholeFile(keyLog));
+    ASSERT_FALSE(writes.empty());
+    EXPECT_EQ(writes.front(), "KEY_VOLUMEUP 1");
+    EXPECT_EQ(writes.back(), "KEY_VOLUMEUP 0");
+}
+
+TEST_F(DaemonEndToEndTest, SigintStopsTheDaemonToo) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    daemon->signal(SIGINT);
+    EXPECT_EQ(daemon->wait(1000ms), 0);
+}
+
+TEST_F(DaemonEndToEndTest, SecondDaemonOnTheSameSocketRefusesToStart) {
+    std::string document = synthesize("long-hold.gestures");
+    auto first = startDaemon(document, {"--no-keys"});
+    ::close(connectControl());
+    auto second = startDaemon(document, {"--no-keys"}, "second");
+    EXPECT_EQ(second->wait(10s), 1);
+    EXPECT_EQ(second->standardError(), "tolkatouchd: another tolkatouchd is already running on " + socket + "\n");
+
+    int control = connectControl();  // the first one still answers
+    EXPECT_EQ(exchange(control, "{\"get\": \"Version\"}\n"), "{\"value\":[28,0,0]}\n");
+    ::close(control);
+    first->signal(SIGTERM);
+    EXPECT_EQ(first->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, MalformedOversizedAndUnknownRequestsGetErrorRepliesAndNothingBlocks) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    int silent = connectControl();  // connects and never writes
+    int halfLine = connectControl();
+    ::send(halfLine, "{\"get\": \"Ver", 12, MSG_NOSIGNAL);
+    ::close(halfLine);  // leaves mid-line
+
+    int control = connectControl();
+    EXPECT_EQ(exchange(control, "not json\n"), "{\"error\":\"malformed request\"}\n");
+    EXPECT_EQ(exchange(control, "[1, 2]\n"), "{\"error\":\"malformed request\"}\n");
+    EXPECT_EQ(exchange(control, "{\"get\": 7}\n"), "{\"error\":\"malformed request: \\\"get\\\" takes a key string\"}\n");
+    EXPECT_EQ(exchange(control, "{\"frobnicate\": true}\n"), "{\"error\":\"unknown request\"}\n");
+    std::thread writer([control] {
+        std::string huge = "{\"get\": \"" + std::string(70000, 'k') + "\"}\n";
+        ::send(control, huge.data(), huge.size(), MSG_NOSIGNAL);
+    });
+    std::string reply = exchange(control, "");
+    writer.join();
+    EXPECT_EQ(reply, "{\"error\":\"request too long (over 65536 bytes)\"}\n");
+    EXPECT_EQ(exchange(control, "{\"get\": \"Version\"}\n"), "{\"value\":[28,0,0]}\n");
+    EXPECT_EQ(exchange(control, "{\"devices\": true}\n"),
+              "{\"devices\":[{\"node\":\"simulated:" + file("long-hold.gestures.json") +
+                  "\",\"product\":1,\"service\":1,\"vendor\":4617}]}\n");
+    ::close(control);
+    ::close(silent);
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, MissingUinputIsOneClearErrorLineAndStatusOne) {
+    auto daemon = std::make_unique<Subprocess>(
+        std::vector<std::string>{TOLKATOUCHD_PATH, "--plugin", TOLKA_PLUGIN_PATH, "--socket", socket, "--uinput",
+                                 directory + "/no-uinput"},
+        file("daemon.out"), file("daemon.err"));
+    EXPECT_EQ(daemon->wait(10s), 1);
+    EXPECT_EQ(daemon->standardError(), "tolkatouchd: cannot open " + directory +
+                                           "/no-uinput for the virtual keyboard: No such file or directory "
+                                           "(--print shows events without it)\n");
+}
+
+TEST_F(DaemonEndToEndTest, DocumentThatIsNotARecordingIsOneClearErrorLine) {
+    std::ofstream(file("bad.json")) << "{\"Version\": 2}";
+    auto daemon = startDaemon(file("bad.json"), {"--no-keys"});
+    EXPECT_EQ(daemon->wait(10s), 1);
+    EXPECT_EQ(daemon->standardError(), "tolkatouchd: the recording " + file("bad.json") +
+                                           " cannot be played: migrateSerializedContainer failed: invalid "
+                                           "container version: 2\n");
+}
+
+TEST_F(DaemonEndToEndTest, PluginThatCannotBeLoadedIsOneClearErrorLine) {
+    auto daemon = std::make_unique<Subprocess>(
+        std::vector<std::string>{TOLKATOUCHD_PATH, "--plugin", directory + "/none.so", "--socket", socket,
+                                 "--no-keys", "--print"},
+        file("daemon.out"), file("daemon.err"));
+    EXPECT_EQ(daemon->wait(10s), 1);
+    EXPECT_EQ(daemon->standardError(), "tolkatouchd: cannot load the plug-in " + directory + "/none.so: " +
+                                           directory + "/none.so: cannot open shared object file: No such file "
+                                                       "or directory\n");
+}
+
+TEST_F(DaemonEndToEndTest, VendorIdThatIsNotHexadecimalIsOneClearErrorLine) {
+    auto daemon = std::make_unique<Subprocess>(
+        std::vector<std::string>{TOLKATOUCHD_PATH, "--vendor", "12g9", "--socket", socket}, file("daemon.out"),
+        file("daemon.err"));
+    EXPECT_EQ(daemon->wait(10s), 1);
+    EXPECT_EQ(daemon->standardError(),
+              "tolkatouchd: --vendor: expected a hexadecimal ID of at most four digits, got \"12g9\"\n");
+}
+
+}  // namespace
+}  // namespace TolkaTouch

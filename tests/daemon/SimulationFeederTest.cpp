@@ -1,0 +1,152 @@
+#include "daemon/SimulationFeeder.h"
+
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <condition_variable>
+#include <filesystem>
+#include <fstream>
+#include <mutex>
+
+namespace TolkaTouch {
+namespace {
+
+class SimulationFeederTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        char pattern[] = "/tmp/tolkatouchd-feeder-XXXXXX";
+        directory = ::mkdtemp(pattern);
+    }
+    void TearDown() override { std::filesystem::remove_all(directory); }
+
+    std::string write(const std::string& text) {
+        std::string path = directory + "/document.json";
+        std::ofstream(path) << text;
+        return path;
+    }
+
+    SimulationFeeder::Target target() {
+        SimulationFeeder::Target result;
+        result.writeReport = [this](const uint8_t* bytes, size_t length) {
+            std::lock_guard lock(mutex);
+            calls.push_back("report " + std::to_string(length) + " " + std::to_string(bytes[0]));
+        };
+        result.applySetting = [this](const std::string& key, const PropertyValue& value) {
+            std::lock_guard lock(mutex);
+            calls.push_back("set " + key + " " + value.description());
+        };
+        result.finished = [this] {
+            std::lock_guard lock(mutex);
+            finished = true;
+            changed.notify_all();
+        };
+        return result;
+    }
+
+    std::string directory;
+    std::mutex mutex;
+    std::condition_variable changed;
+    std::vector<std::string> calls;
+    bool finished = false;
+};
+
+TEST_F(SimulationFeederTest, FramesGoOutInOrderThenFinishedIsCalled) {
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 03 "},
+        {"Type": "State", "Timestamp": 1500, "Key": "Algs.HoldTimeoutMilliseconds", "Value": 700},
+        {"Type": "InputReport", "Timestamp": 2000, "Report": "02 00 "}]})");
+    SimulationFeeder feeder(path, 1.0f);
+    feeder.start(target());
+    std::unique_lock lock(mutex);
+    changed.wait(lock, [this] { return finished; });
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 3 1", "set Algs.HoldTimeoutMilliseconds 700", "report 2 2"}));
+}
+
+TEST_F(SimulationFeederTest, StopCutsALongPauseShortAndSkipsFinished) {
+    // The second report is an hour after the first.
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 0, "Report": "01 "},
+        {"Type": "InputReport", "Timestamp": 3600000000000, "Report": "01 "}]})");
+    SimulationFeeder feeder(path, 1.0f);
+    feeder.start(target());
+    for (;;) {
+        std::lock_guard lock(mutex);
+        if (!calls.empty()) break;
+    }
+    feeder.stop();
+    EXPECT_TRUE(feeder.stopRequested());
+    EXPECT_FALSE(finished);
+}
+
+TEST_F(SimulationFeederTest, DocumentThatDoesNotReadIsAClearError) {
+    std::string path = write("{\"Version\": 1, \"Frames\": 5}");
+    try {
+        SimulationFeeder feeder(path, 1.0f);
+        FAIL();
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()), "the recording " + path + " cannot be played: invalid frames");
+    }
+}
+
+TEST_F(SimulationFeederTest, MissingDocumentIsAClearError) {
+    try {
+        SimulationFeeder feeder(directory + "/none.json", 1.0f);
+        FAIL();
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()),
+                  "cannot read the recording " + directory + "/none.json: No such file or directory");
+    }
+}
+
+TEST_F(SimulationFeederTest, OlderLayoutPlaysItsReports) {
+    std::string path = write(R"({"Version": 0, "Reports": [
+        {"Timestamp": 5, "ReportData": "01 02 "}, {"Timestamp": 6, "ReportData": "02 "}]})");
+    SimulationFeeder feeder(path, 1.0f);
+    feeder.start(target());
+    std::unique_lock lock(mutex);
+    changed.wait(lock, [this] { return finished; });
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 2 1", "report 1 2"}));
+}
+
+TEST_F(SimulationFeederTest, VersionWrittenAfterTheFramesStillPlays) {
+    std::string path = write(R"({"Frames": [{"Type": "InputReport", "Timestamp": 1, "Report": "07 "}], "Version": 1})");
+    SimulationFeeder feeder(path, 1.0f);
+    feeder.start(target());
+    std::unique_lock lock(mutex);
+    changed.wait(lock, [this] { return finished; });
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 1 7"}));
+}
+
+TEST_F(SimulationFeederTest, EmptyRecordingFinishesAtOnce) {
+    SimulationFeeder feeder(write(R"({"Version": 1, "Frames": []})"), 1.0f);
+    feeder.start(target());
+    std::unique_lock lock(mutex);
+    changed.wait(lock, [this] { return finished; });
+    EXPECT_TRUE(calls.empty());
+}
+
+TEST_F(SimulationFeederTest, BadFrameAfterGoodOnesGivesTheReadersMessage) {
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1, "Report": "01 "},
+        {"Type": "state", "Timestamp": 2, "Key": "Algs.X"}]})");
+    try {
+        SimulationFeeder feeder(path, 1.0f);
+        FAIL();
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()), "the recording " + path + " cannot be played: invalid frame type");
+    }
+}
+
+TEST_F(SimulationFeederTest, TextThatIsNotJsonGivesTheReadersMessage) {
+    std::string path = write("{\"Version\": 1, \"Frames\": [");
+    try {
+        SimulationFeeder feeder(path, 1.0f);
+        FAIL();
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()),
+                  "the recording " + path + " cannot be played: migrateSerializedContainer failed: invalid container");
+    }
+}
+
+}  // namespace
+}  // namespace TolkaTouch
