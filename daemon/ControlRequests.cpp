@@ -1,7 +1,7 @@
 #include "daemon/ControlRequests.h"
 
 #include "daemon/ControlServer.h"
-#include "daemon/PropertyJson.h"
+#include "platform/PropertyValueJson.h"
 
 namespace TolkaTouch {
 
@@ -46,14 +46,14 @@ std::string answerControlRequest(const std::string& line, ControlTarget& target)
         if (!it->is_string()) return error("malformed request: \"get\" takes a key string");
         auto value = target.getProperty(service, it->get<std::string>());
         if (!value) return noSuchDevice(service);
-        return dump(json{{"value", jsonFromProperty(*value)}});
+        return dump(json{{"value", json(PropertyValueJson::toJson(*value))}});
     }
     if (auto it = request.find("set"); it != request.end()) {
         auto value = request.find("value");
         if (!it->is_string() || value == request.end()) {
             return error("malformed request: \"set\" takes a key string and a \"value\"");
         }
-        auto ok = target.setProperty(service, it->get<std::string>(), propertyFromJson(*value));
+        auto ok = target.setProperty(service, it->get<std::string>(), PropertyValueJson::fromJson(*value));
         if (!ok) return noSuchDevice(service);
         return dump(json{{"ok", *ok}});
     }

@@ -14,13 +14,13 @@
 #include "daemon/ControlServer.h"
 #include "daemon/CountingHIDDevice.h"
 #include "daemon/DeviceDiscovery.h"
-#include "daemon/EventJson.h"
 #include "daemon/KeyLogOutput.h"
 #include "daemon/KeyMapper.h"
 #include "daemon/PluginInstance.h"
 #include "daemon/PluginLibrary.h"
 #include "daemon/SimulationFeeder.h"
 #include "daemon/UinputKeyOutput.h"
+#include "platform/HIDEventJson.h"
 #include "platform/HIDServiceRegistry.h"
 #include "platform/HidrawDevice.h"
 #include "platform/RunLoop.h"
@@ -288,14 +288,14 @@ void Daemon::armRepeatTimer() {
         auto due = device->keys->nextRepeatTime();
         if (due && (!next || *due < *next)) next = due;
     }
-    itimerspec spec{};
+    itimerspec timer{};
     if (next) {
         // Zero would disarm the timer: a time already past is given as one nanosecond.
         auto count = std::max<int64_t>(next->count(), 1);
-        spec.it_value.tv_sec = static_cast<time_t>(count / 1'000'000'000);
-        spec.it_value.tv_nsec = static_cast<long>(count % 1'000'000'000);
+        timer.it_value.tv_sec = static_cast<time_t>(count / 1'000'000'000);
+        timer.it_value.tv_nsec = static_cast<long>(count % 1'000'000'000);
     }
-    ::timerfd_settime(_timerFd, TFD_TIMER_ABSTIME, &spec, nullptr);
+    ::timerfd_settime(_timerFd, TFD_TIMER_ABSTIME, &timer, nullptr);
 }
 
 void Daemon::beginShutdown() {

@@ -9,7 +9,7 @@
 #include <nlohmann/json.hpp>
 
 #include "pipeline/PipelineRecording.h"
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 #include "pipeline/common/Util.h"
 
 namespace TolkaTouch {

@@ -8,7 +8,7 @@
 
 #include <CLI/CLI.hpp>
 
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 #include "tools/Commands.h"
 #include "tools/ControlClient.h"
 #include "tools/DocumentFile.h"

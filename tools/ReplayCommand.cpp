@@ -7,6 +7,7 @@
 
 #include <CLI/CLI.hpp>
 
+#include "platform/HIDEventJson.h"
 #include "platform/Log.h"
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"

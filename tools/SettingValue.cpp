@@ -3,7 +3,7 @@
 #include <cstdint>
 #include <optional>
 
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 
 namespace TolkaTouch::Tools {
 

@@ -9,7 +9,7 @@
 
 #include <CLI/CLI.hpp>
 
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 #include "pipeline/common/Reports.h"
 #include "pipeline/common/Util.h"
 #include "platform/Format.h"

@@ -7,7 +7,7 @@
 
 #include <nlohmann/json.hpp>
 
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 #include "platform/Format.h"
 
 namespace TolkaTouch::Tools {

@@ -44,19 +44,6 @@ uint64_t nanosecondsFromMachTime(uint64_t ticks) {
     return scale(ticks, base.numerator, base.denominator);
 }
 
-std::string hexStringFromBytes(const std::vector<uint8_t>& bytes) {
-    static constexpr char kDigits[] = "0123456789abcdef";
-    std::string text;
-    text.reserve(bytes.size() * 3);
-    for (uint8_t byte : bytes) {
-        // "%02x " per byte; the trailing space is part of the format the parser below accepts.
-        text += kDigits[byte >> 4];
-        text += kDigits[byte & 0xF];
-        text += ' ';
-    }
-    return text;
-}
-
 std::vector<uint8_t> bytesFromHexString(const std::string* text) {
     static const std::string empty;
     return bytesFromHexString(text ? *text : empty);

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "platform/HIDEventJson.h"
 #include "tools/EventPrinter.h"
 #include "tools/GestureScript.h"
 #include "tools/Synthesizer.h"

@@ -12,7 +12,7 @@
 #include <vector>
 
 #include "pipeline/common/Reports.h"
-#include "tools/EventPrinter.h"
+#include "platform/HIDEventJson.h"
 #include "tools/GestureScript.h"
 #include "tools/Replayer.h"
 #include "tools/Synthesizer.h"

@@ -48,9 +48,9 @@ Bytes replyBytes(const uhid_event& reply) {
     return Bytes(reply.u.get_report_reply.data, reply.u.get_report_reply.data + reply.u.get_report_reply.size);
 }
 
-std::string featureError(const std::string& spec) {
+std::string featureError(const std::string& text) {
     try {
-        VirtualSurface::featureFromSpec(spec);
+        VirtualSurface::featureFromSpec(text);
     } catch (const std::invalid_argument& error) {
         return error.what();
     }

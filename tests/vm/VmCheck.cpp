@@ -47,7 +47,7 @@
 #include "daemon/SurfaceIds.h"
 #include "pipeline/Pipeline.h"
 #include "pipeline/PipelineRecording.h"
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 #include "pipeline/common/ReportDescriptor.h"
 #include "tools/VirtualSurface.h"
 
@@ -181,8 +181,8 @@ void checkHidraw(const std::string& node, const std::string& documentPath, const
     }
 
     auto answers = VirtualSurface::defaultFeatureReports();
-    for (const auto& spec : features) {
-        auto [id, bytes] = VirtualSurface::featureFromSpec(spec);
+    for (const auto& feature : features) {
+        auto [id, bytes] = VirtualSurface::featureFromSpec(feature);
         answers[id] = bytes;
     }
     std::vector<uint8_t> failingIDs;
@@ -491,8 +491,8 @@ std::string readText(const std::string& path) {
 void checkProps(const std::string& firmwareFile, const std::string& holdFile, const std::vector<std::string>& features,
                 const std::vector<std::string>& failing) {
     auto answers = VirtualSurface::defaultFeatureReports();
-    for (const auto& spec : features) {
-        auto [id, bytes] = VirtualSurface::featureFromSpec(spec);
+    for (const auto& feature : features) {
+        auto [id, bytes] = VirtualSurface::featureFromSpec(feature);
         answers[id] = bytes;
     }
     std::vector<uint8_t> failingIDs;

@@ -134,13 +134,13 @@ for path in "${module_paths[@]}"; do
     echo "$base" >> "$root/etc/modules"
 done
 
-for spec in "${files[@]}"; do
-    mkdir -p "$root$(dirname "${spec#*:}")"
-    cp -L "${spec%%:*}" "$root${spec#*:}"
+for entry in "${files[@]}"; do
+    mkdir -p "$root$(dirname "${entry#*:}")"
+    cp -L "${entry%%:*}" "$root${entry#*:}"
 done
-for spec in "${dirs[@]}"; do
-    mkdir -p "$root${spec#*:}"
-    cp -rL "${spec%%:*}/." "$root${spec#*:}/"
+for entry in "${dirs[@]}"; do
+    mkdir -p "$root${entry#*:}"
+    cp -rL "${entry%%:*}/." "$root${entry#*:}/"
 done
 [ -x "$root/init" ] || { echo "build-initramfs: no /init given (--file SRC:/init)" >&2; exit 2; }
 

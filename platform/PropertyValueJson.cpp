@@ -1,11 +1,11 @@
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 
 #include <cmath>
 #include <string>
 #include <utility>
 #include <vector>
 
-#include "pipeline/common/Util.h"
+#include "platform/Format.h"
 
 namespace TolkaTouch::PropertyValueJson {
 
@@ -109,7 +109,7 @@ nlohmann::ordered_json toJson(const PropertyValue& value, size_t maxDepth) {
         return number;
     }
     case PropertyValue::Kind::String: return *value.string();
-    case PropertyValue::Kind::Data: return Util::hexStringFromBytes(*value.data());
+    case PropertyValue::Kind::Data: return hexStringFromBytes(*value.data());
     case PropertyValue::Kind::Array: {
         nlohmann::ordered_json array = nlohmann::ordered_json::array();
         for (const PropertyValue& element : *value.array()) array.push_back(toJson(element, maxDepth - 1));
@@ -127,6 +127,27 @@ nlohmann::ordered_json toJson(const PropertyValue& value, size_t maxDepth) {
     }
     }
     return nullptr;
+}
+
+PropertyValue fromJson(const nlohmann::json& json) {
+    switch (json.type()) {
+    case nlohmann::json::value_t::boolean: return PropertyValue(json.get<bool>());
+    case nlohmann::json::value_t::number_integer: return PropertyValue(json.get<long long>());
+    case nlohmann::json::value_t::number_unsigned: return PropertyValue(json.get<unsigned long long>());
+    case nlohmann::json::value_t::number_float: return PropertyValue(json.get<double>());
+    case nlohmann::json::value_t::string: return PropertyValue(json.get<std::string>());
+    case nlohmann::json::value_t::array: {
+        PropertyValue::Array array;
+        for (const auto& element : json) array.push_back(fromJson(element));
+        return PropertyValue(std::move(array));
+    }
+    case nlohmann::json::value_t::object: {
+        PropertyValue::Dictionary dictionary;
+        for (const auto& [key, element] : json.items()) dictionary.emplace(key, fromJson(element));
+        return PropertyValue(std::move(dictionary));
+    }
+    default: return PropertyValue();
+    }
 }
 
 }  // namespace TolkaTouch::PropertyValueJson

@@ -1,5 +1,6 @@
 #pragma once
-// PropertyValueJson: JSON text to PropertyValue and back, for the recording document.
+// PropertyValueJson: JSON text to PropertyValue and back, for the recording document and the
+// control socket.
 //
 // Reading keeps the number kinds apart: a JSON integer without a sign becomes an unsigned
 // number, one with a minus sign a signed number, anything with a fraction or exponent a floating
@@ -9,7 +10,8 @@
 //
 // Writing turns a PropertyValue into an ordered nlohmann::json (dictionary members in their
 // sorted order). Byte data, which JSON cannot hold, is written as its hex text ("0a ff ");
-// floating values that are not finite are written as null.
+// floating values that are not finite are written as null. Already parsed JSON (a control
+// request's value) converts with fromJson.
 
 #include <cstddef>
 #include <cstdint>
@@ -32,5 +34,10 @@ std::optional<PropertyValue> parse(const uint8_t* text, size_t length);
 // than maxDepth levels are written as null, so that whatever is written can be read back (and
 // the walk's recursion stays bounded).
 nlohmann::ordered_json toJson(const PropertyValue& value, size_t maxDepth = kMaxNestingDepth);
+
+// The value of parsed JSON, kinds as parse() gives them (null, and binary values, become null).
+// The walk recurses once per level, so callers bound the depth when parsing, as the control
+// socket's parser does.
+PropertyValue fromJson(const nlohmann::json& json);
 
 }  // namespace TolkaTouch::PropertyValueJson

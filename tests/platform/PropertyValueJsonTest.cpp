@@ -1,4 +1,4 @@
-#include "pipeline/PropertyValueJson.h"
+#include "platform/PropertyValueJson.h"
 
 #include <gtest/gtest.h>
 
@@ -132,6 +132,29 @@ TEST(PropertyValueJsonTest, DictionaryMembersAreWrittenInSortedOrder) {
         {"a", PropertyValue(PropertyValue::Dictionary{})},
     });
     EXPECT_EQ(PropertyValueJson::toJson(value).dump(), R"({"a":{},"b":[1,"x"]})");
+}
+
+TEST(PropertyValueJsonTest, ParsedJsonBecomesTheMatchingPropertyKinds) {
+    const PropertyValue value = PropertyValueJson::fromJson(nlohmann::json::parse(
+        R"({"s": -1, "u": 2, "f": 1.5, "b": false, "n": null, "t": "x", "a": [1], "d": {"k": true}})"));
+    ASSERT_TRUE(value.isDictionary());
+    EXPECT_EQ(value.find("s")->kind(), PropertyValue::Kind::Signed);
+    EXPECT_EQ(*value.find("s"), PropertyValue(-1));
+    EXPECT_EQ(value.find("u")->kind(), PropertyValue::Kind::Unsigned);
+    EXPECT_EQ(*value.find("u"), PropertyValue(2u));
+    EXPECT_EQ(*value.find("f"), PropertyValue(1.5));
+    EXPECT_EQ(*value.find("b"), PropertyValue(false));
+    EXPECT_TRUE(value.find("n")->isNull());
+    EXPECT_EQ(*value.find("t"), PropertyValue("x"));
+    EXPECT_EQ(*value.find("a"), PropertyValue(PropertyValue::Array{PropertyValue(1u)}));
+    EXPECT_EQ(*value.find("d"), PropertyValue(PropertyValue::Dictionary{{"k", PropertyValue(true)}}));
+}
+
+TEST(PropertyValueJsonTest, ParsedScalarsConvertOnTheirOwn) {
+    EXPECT_EQ(PropertyValueJson::fromJson(nlohmann::json(18446744073709551615ull)),
+              PropertyValue(std::numeric_limits<uint64_t>::max()));
+    EXPECT_EQ(PropertyValueJson::fromJson(nlohmann::json("text")), PropertyValue("text"));
+    EXPECT_TRUE(PropertyValueJson::fromJson(nlohmann::json()).isNull());
 }
 
 }  // namespace
