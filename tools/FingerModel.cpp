@@ -5,39 +5,21 @@
 #include <limits>
 #include <string_view>
 
+#include "algs/Algs.h"
+#include "pipeline/common/Util.h"
+
 namespace TolkaTouch::Tools {
 
 namespace {
-
-// The image drawing of the pixels' physical layout, 13 rows of 36 columns.
-constexpr std::array<std::string_view, 13> kLayout = {
-    "           HHHH      GGGG           ",
-    "                IIII                ",
-    "     BBBB                  AAAA     ",
-    "         JJJJ          JJJJ         ",
-    "     FFFF                  EEEE     ",
-    " AAAA                          BBBB ",
-    "                KKKK                ",
-    " DDDD                          CCCC ",
-    "     EEEE                  FFFF     ",
-    "         LLLL          LLLL         ",
-    "     CCCC                  DDDD     ",
-    "                MMMM                ",
-    "           NNNN      OOOO           ",
-};
 
 constexpr double kColumnWidth = 0.5;
 constexpr double kCentreRow = 6.0;       // the row of K, counted from 0
 constexpr double kCentreColumn = 17.5;  // the middle of K's run
 
-constexpr std::array<float, kPixelCount> kGains = {1.9219f, 1.8833f, 1.9281f, 1.8837f, 1.9163f,
-                                                    1.8105f, 1.0081f, 1.0f,    1.4851f, 1.5033f,
-                                                    2.4154f, 1.5378f, 1.5431f, 1.04f,   1.0493f};
-
 std::vector<Pad> padsFromLayout() {
     std::vector<Pad> pads;
-    for (size_t row = 0; row < kLayout.size(); ++row) {
-        const std::string_view text = kLayout[row];
+    for (size_t row = 0; row < Util::kImageLayout.size(); ++row) {
+        const std::string_view text = Util::kImageLayout[row];
         size_t column = 0;
         while (column < text.size()) {
             if (text[column] == ' ') {
@@ -87,7 +69,7 @@ SurfacePoint FingerModel::zoneCentre(Zone zone) {
     return SurfacePoint{};
 }
 
-float FingerModel::pixelGain(int pixel) { return kGains.at(static_cast<size_t>(pixel)); }
+float FingerModel::pixelGain(int pixel) { return Algs::pixelGains.at(static_cast<size_t>(pixel)); }
 
 SensorReadings FingerModel::read(const std::optional<FingerContact>& contact) {
     std::array<double, kPixelCount> scaled{};
@@ -98,7 +80,7 @@ SensorReadings FingerModel::read(const std::optional<FingerContact>& contact) {
     for (size_t pixel = 0; pixel < kPixelCount; ++pixel) {
         // The baseline wanders by a fraction of a count per frame and is pulled back.
         _drift[pixel] = 0.98 * _drift[pixel] + _random.normal(0.3);
-        const double reading = scaled[pixel] / kGains[pixel] + _drift[pixel] + _random.normal(kNoiseDeviation);
+        const double reading = scaled[pixel] / Algs::pixelGains[pixel] + _drift[pixel] + _random.normal(kNoiseDeviation);
         readings.pixels[pixel] = clampTo<int16_t>(reading);
         readings.rawPixels[pixel] = clampTo<uint16_t>(_baseline[pixel] + readings.pixels[pixel]);
     }

@@ -73,9 +73,9 @@ void runUhid(const UhidOptions& options) {
     surfaceOptions.vendor = options.vendor;
     surfaceOptions.product = options.product;
     surfaceOptions.featureReports = VirtualSurface::defaultFeatureReports();
-    for (const auto& spec : options.features) {
+    for (const auto& option : options.features) {
         try {
-            auto [id, bytes] = VirtualSurface::featureFromSpec(spec);
+            auto [id, bytes] = VirtualSurface::featureFromOption(option);
             surfaceOptions.featureReports[id] = bytes;
         } catch (const std::invalid_argument& error) {
             throw ToolError("--feature", error.what());

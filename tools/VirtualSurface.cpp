@@ -65,22 +65,22 @@ uint8_t VirtualSurface::reportIDFromText(const std::string& text) {
     return static_cast<uint8_t>(value);
 }
 
-std::pair<uint8_t, std::vector<uint8_t>> VirtualSurface::featureFromSpec(const std::string& spec) {
-    auto equals = spec.find('=');
-    if (equals == std::string::npos) throw std::invalid_argument("expected ID=HEX, got " + spec);
-    uint8_t id = reportIDFromText(spec.substr(0, equals));
+std::pair<uint8_t, std::vector<uint8_t>> VirtualSurface::featureFromOption(const std::string& option) {
+    auto equals = option.find('=');
+    if (equals == std::string::npos) throw std::invalid_argument("expected ID=HEX, got " + option);
+    uint8_t id = reportIDFromText(option.substr(0, equals));
     std::string digits;
-    for (char c : spec.substr(equals + 1)) {
+    for (char c : option.substr(equals + 1)) {
         if (c == ' ' || c == ':') continue;
-        if (!std::isxdigit(static_cast<unsigned char>(c))) throw std::invalid_argument("not hex: " + spec);
+        if (!std::isxdigit(static_cast<unsigned char>(c))) throw std::invalid_argument("not hex: " + option);
         digits += c;
     }
-    if (digits.size() % 2 != 0) throw std::invalid_argument("odd number of hex digits: " + spec);
+    if (digits.size() % 2 != 0) throw std::invalid_argument("odd number of hex digits: " + option);
     std::vector<uint8_t> bytes{id};
     for (size_t i = 0; i < digits.size(); i += 2) {
         bytes.push_back(static_cast<uint8_t>(std::stoul(digits.substr(i, 2), nullptr, 16)));
     }
-    if (bytes.size() > 128) throw std::invalid_argument("longer than 127 bytes after the ID: " + spec);
+    if (bytes.size() > 128) throw std::invalid_argument("longer than 127 bytes after the ID: " + option);
     return {id, bytes};
 }
 

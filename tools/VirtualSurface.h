@@ -48,7 +48,7 @@ public:
     // A feature answer written "ID=HEX": the report ID (decimal or 0x hex, 1 to 255) and the bytes
     // after it as hex digit pairs, spaces and colons allowed. Returns the whole report, ID first.
     // Throws std::invalid_argument with a one-line message.
-    static std::pair<uint8_t, std::vector<uint8_t>> featureFromSpec(const std::string& spec);
+    static std::pair<uint8_t, std::vector<uint8_t>> featureFromOption(const std::string& option);
 
     // A report ID written in decimal or 0x hex, 1 to 255. Throws std::invalid_argument.
     static uint8_t reportIDFromText(const std::string& text);

@@ -74,24 +74,6 @@ bool stripDomainFromKey(std::string& key, const std::string& domain) {
 
 namespace {
 
-// The surface's pixels as they sit on the device, each drawn as a run of four letters; the
-// letters of a pixel that spans two places appear twice and show the same reading.
-constexpr const char* kImageTemplate[] = {
-    "           HHHH      GGGG           ",
-    "                IIII                ",
-    "     BBBB                  AAAA     ",
-    "         JJJJ          JJJJ         ",
-    "     FFFF                  EEEE     ",
-    " AAAA                          BBBB ",
-    "                KKKK                ",
-    " DDDD                          CCCC ",
-    "     EEEE                  FFFF     ",
-    "         LLLL          LLLL         ",
-    "     CCCC                  DDDD     ",
-    "                MMMM                ",
-    "           NNNN      OOOO           ",
-};
-
 [[noreturn]] void failPixelLetterAssertion() {
     std::fprintf(stderr, "Assertion failed: (%s), function %s, file %s, line %d.\n", "c>='A' && c<='O'",
                  "stringFromImage", "Util", 42);
@@ -111,7 +93,7 @@ void appendPixelField(std::string& body, intmax_t value, int runLength) {
 
 std::string stringFromImage(const InputReport::Image& image, bool useRawPixels) {
     std::string body;
-    for (const char* row : kImageTemplate) {
+    for (const char* row : kImageLayout) {
         int runLength = 0;
         char previous = '\0';
         for (const char* p = row;; ++p) {

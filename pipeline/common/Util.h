@@ -3,6 +3,7 @@
 // and from nanoseconds, bytes to and from hex text, state-key domains, and a text drawing of an
 // image report.
 
+#include <array>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -28,6 +29,25 @@ std::vector<uint8_t> bytesFromHexString(const std::string& text);
 
 // True when key starts with domain + "."; that prefix is then removed from key.
 bool stripDomainFromKey(std::string& key, const std::string& domain);
+
+// The surface's pixels as they sit on the device: 13 rows of 36 columns, each pixel a run of four
+// of its letter ('A' is pixel 0, 'O' pixel 14). A pixel that spans two places (A-F, J, L) appears
+// twice. Every run is followed by a space.
+inline constexpr std::array<const char*, 13> kImageLayout = {
+    "           HHHH      GGGG           ",
+    "                IIII                ",
+    "     BBBB                  AAAA     ",
+    "         JJJJ          JJJJ         ",
+    "     FFFF                  EEEE     ",
+    " AAAA                          BBBB ",
+    "                KKKK                ",
+    " DDDD                          CCCC ",
+    "     EEEE                  FFFF     ",
+    "         LLLL          LLLL         ",
+    "     CCCC                  DDDD     ",
+    "                MMMM                ",
+    "           NNNN      OOOO           ",
+};
 
 // The image drawn on the surface's pixel layout: signed readings, or raw ones when useRawPixels.
 std::string stringFromImage(const InputReport::Image& image, bool useRawPixels);

@@ -50,7 +50,7 @@ Bytes replyBytes(const uhid_event& reply) {
 
 std::string featureError(const std::string& text) {
     try {
-        VirtualSurface::featureFromSpec(text);
+        VirtualSurface::featureFromOption(text);
     } catch (const std::invalid_argument& error) {
         return error.what();
     }
@@ -143,10 +143,10 @@ TEST(VirtualSurfaceTest, StartOpenAndCloseAreFollowedWithoutReply) {
 }
 
 TEST(VirtualSurfaceTest, FeatureSpecReadsTheIDInHexOrDecimalAndTheBytesAfterIt) {
-    EXPECT_EQ(VirtualSurface::featureFromSpec("0x1f=88130000").second, (Bytes{0x1F, 0x88, 0x13, 0x00, 0x00}));
-    EXPECT_EQ(VirtualSurface::featureFromSpec("31=88 13:00 00").second, (Bytes{0x1F, 0x88, 0x13, 0x00, 0x00}));
-    EXPECT_EQ(VirtualSurface::featureFromSpec("0x10=").second, (Bytes{0x10}));
-    EXPECT_EQ(VirtualSurface::featureFromSpec("010=ff").first, 10);
+    EXPECT_EQ(VirtualSurface::featureFromOption("0x1f=88130000").second, (Bytes{0x1F, 0x88, 0x13, 0x00, 0x00}));
+    EXPECT_EQ(VirtualSurface::featureFromOption("31=88 13:00 00").second, (Bytes{0x1F, 0x88, 0x13, 0x00, 0x00}));
+    EXPECT_EQ(VirtualSurface::featureFromOption("0x10=").second, (Bytes{0x10}));
+    EXPECT_EQ(VirtualSurface::featureFromOption("010=ff").first, 10);
 }
 
 TEST(VirtualSurfaceTest, FeatureSpecRefusesWhatItCannotRead) {

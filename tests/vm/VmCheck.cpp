@@ -182,7 +182,7 @@ void checkHidraw(const std::string& node, const std::string& documentPath, const
 
     auto answers = VirtualSurface::defaultFeatureReports();
     for (const auto& feature : features) {
-        auto [id, bytes] = VirtualSurface::featureFromSpec(feature);
+        auto [id, bytes] = VirtualSurface::featureFromOption(feature);
         answers[id] = bytes;
     }
     std::vector<uint8_t> failingIDs;
@@ -492,7 +492,7 @@ void checkProps(const std::string& firmwareFile, const std::string& holdFile, co
                 const std::vector<std::string>& failing) {
     auto answers = VirtualSurface::defaultFeatureReports();
     for (const auto& feature : features) {
-        auto [id, bytes] = VirtualSurface::featureFromSpec(feature);
+        auto [id, bytes] = VirtualSurface::featureFromOption(feature);
         answers[id] = bytes;
     }
     std::vector<uint8_t> failingIDs;

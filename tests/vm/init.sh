@@ -10,7 +10,9 @@ mount -t proc proc /proc
 mount -t sysfs sys /sys
 mount -t devtmpfs dev /dev
 mount -t tmpfs run /run
-mount -t tmpfs tmp /tmp
+# /tmp stays part of the initramfs itself (already in memory): the project's programs sit at their
+# build-tree paths, which may lie under /tmp, and a fresh mount there would hide them.
+mkdir -p /tmp
 mount -t debugfs debugfs /sys/kernel/debug 2>/dev/null
 mkdir -p /dev/pts /run/tolkatouch /root
 mount -t devpts devpts /dev/pts
