@@ -15,26 +15,12 @@ tolkatouch=${2:?usage: $0 <tolkatouchd> <tolkatouch> <plug-in library> [seconds]
 plugin=${3:?usage: $0 <tolkatouchd> <tolkatouch> <plug-in library> [seconds]}
 seconds=${4:-30}
 frames=$(( seconds * 125 ))
-examples=$(cd "$(dirname "$0")/../../examples" && pwd)
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
-count_frames() { grep -c '"Type": "InputReport"' "$1"; }
-
-# Passes of the everyday session until the frames are filled, then a wait that makes the count
-# exact (one frame every 8 ms).
-grep -v '^#' "$examples/everyday-session.txt" > "$work/pass.txt"
-"$tolkatouch" synth "$work/pass.txt" -o "$work/pass.json"
-passes=$(( frames / $(count_frames "$work/pass.json") ))
-: > "$work/long.txt"
-for _ in $(seq "$passes"); do cat "$work/pass.txt" >> "$work/long.txt"; done
-"$tolkatouch" synth "$work/long.txt" -o "$work/long.json"
-missing=$(( frames - $(count_frames "$work/long.json") ))
-if [ "$missing" -gt 0 ]; then
-  echo "wait $(( missing * 8 ))ms" >> "$work/long.txt"
-  "$tolkatouch" synth "$work/long.txt" -o "$work/long.json"
-fi
-actual=$(count_frames "$work/long.json")
+source "$(dirname "$0")/../long_session.sh"
+synth_long_session "$tolkatouch" "$frames" "$work/long.json"
+actual=$(grep -c '"Type": "InputReport"' "$work/long.json")
 
 /usr/bin/time -v -o "$work/time.txt" \
   "$daemon" --simulate "$work/long.json" --plugin "$plugin" --socket "$work/tolkatouchd.sock" \

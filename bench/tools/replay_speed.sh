@@ -8,26 +8,12 @@ set -euo pipefail
 
 tolkatouch=${1:?usage: $0 <path to tolkatouch> [frames]}
 frames=${2:-100000}
-examples=$(cd "$(dirname "$0")/../../examples" && pwd)
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
-count_frames() { grep -c '"Type": "InputReport"' "$1"; }
-
-# One pass of the everyday session, then as many passes as fill the frames, then a wait that
-# makes the count exact (one frame every 8 ms).
-grep -v '^#' "$examples/everyday-session.txt" > "$work/pass.txt"
-"$tolkatouch" synth "$work/pass.txt" -o "$work/pass.json"
-passes=$(( frames / $(count_frames "$work/pass.json") ))
-: > "$work/long.txt"
-for _ in $(seq "$passes"); do cat "$work/pass.txt" >> "$work/long.txt"; done
-"$tolkatouch" synth "$work/long.txt" -o "$work/long.json"
-missing=$(( frames - $(count_frames "$work/long.json") ))
-if [ "$missing" -gt 0 ]; then
-  echo "wait $(( missing * 8 ))ms" >> "$work/long.txt"
-  "$tolkatouch" synth "$work/long.txt" -o "$work/long.json"
-fi
-actual=$(count_frames "$work/long.json")
+source "$(dirname "$0")/../long_session.sh"
+synth_long_session "$tolkatouch" "$frames" "$work/long.json"
+actual=$(grep -c '"Type": "InputReport"' "$work/long.json")
 size=$(stat -c %s "$work/long.json")
 
 # Wall-clock and processor seconds (user + system) of each run; the best wall time counts. On a
