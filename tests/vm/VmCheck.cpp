@@ -32,13 +32,15 @@
 #include <cstring>
 #include <dirent.h>
 #include <fstream>
+#include <charconv>
 #include <map>
+#include <optional>
 #include <memory>
 #include <nlohmann/json.hpp>
-#include <regex>
 #include <set>
 #include <sstream>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include <libevdev/libevdev.h>
@@ -87,26 +89,43 @@ PipelineRecording loadDocument(const std::string& path) {
 
 // ---- hidraw ----
 
-// Report lengths (bytes after the ID) as the kernel's parser laid them out, from its debugfs dump.
+// The number in "<prefix><digits>)" at the start of text (leading blanks skipped), if it is there.
+std::optional<uint32_t> numberAfter(std::string_view text, std::string_view prefix) {
+    text.remove_prefix(std::min(text.find_first_not_of(" \t"), text.size()));
+    if (!text.starts_with(prefix)) return std::nullopt;
+    text.remove_prefix(prefix.size());
+    uint32_t number = 0;
+    auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (error != std::errc() || end == text.data() + text.size() || *end != ')') return std::nullopt;
+    return number;
+}
+
+// Report lengths (bytes after the ID) as the kernel's parser laid them out, from its debugfs dump:
+// a report starts at a line "INPUT(1)[...", "OUTPUT(..." or "FEATURE(...", and each of its fields
+// adds "Report Size(bits)" times "Report Count(n)".
 std::map<std::pair<std::string, int>, uint32_t> kernelReportLengths(const std::string& dumpPath) {
     std::ifstream in(dumpPath);
     std::map<std::pair<std::string, int>, uint32_t> bits;
     if (!in) return bits;
-    std::regex header(R"(^\s*(INPUT|OUTPUT|FEATURE)\((\d+)\)\[)");
-    std::regex size(R"(^\s*Report Size\((\d+)\))");
-    std::regex count(R"(^\s*Report Count\((\d+)\))");
     std::pair<std::string, int> current{"", -1};
     uint32_t fieldSize = 0;
     std::string line;
-    std::smatch match;
     while (std::getline(in, line)) {
-        if (std::regex_search(line, match, header)) {
-            current = {match[1], std::stoi(match[2])};
-            bits[current] += 0;
-        } else if (current.second >= 0 && std::regex_search(line, match, size)) {
-            fieldSize = std::stoul(match[1]);
-        } else if (current.second >= 0 && std::regex_search(line, match, count)) {
-            bits[current] += fieldSize * std::stoul(match[1]);
+        bool header = false;
+        for (const char* kind : {"INPUT", "OUTPUT", "FEATURE"}) {
+            const auto id = numberAfter(line, std::string(kind) + "(");
+            if (id && line.find(std::string(kind) + "(" + std::to_string(*id) + ")[") != std::string::npos) {
+                current = {kind, static_cast<int>(*id)};
+                bits[current] += 0;
+                header = true;
+                break;
+            }
+        }
+        if (header || current.second < 0) continue;
+        if (const auto size = numberAfter(line, "Report Size(")) {
+            fieldSize = *size;
+        } else if (const auto count = numberAfter(line, "Report Count(")) {
+            bits[current] += fieldSize * *count;
         }
     }
     for (auto& [key, value] : bits) value /= 8;
