@@ -37,20 +37,11 @@ PipelineRecording& PipelineRecording::operator=(const PipelineRecording& other) 
     return *this;
 }
 
-// Moving a list keeps iterators to its elements valid, but not its end.
-PipelineRecording::PipelineRecording(PipelineRecording&& other) noexcept
-    : PipelineInput(other),
-      pipeline(std::move(other.pipeline)),
-      clock(std::move(other.clock)),
-      _maxFrameCount(other._maxFrameCount) {
-    const bool atEnd = other._play.iterator == other._frames.end();
-    _frames = std::move(other._frames);
-    _play = other._play;
-    if (atEnd || !_play.valid) _play.iterator = _frames.end();
-    other._frames.clear();
-    other._play = PlayCursor{false, other._frames.end(), 0, std::nullopt};
+PipelineRecording::PipelineRecording(PipelineRecording&& other) noexcept : PipelineInput(other) {
+    *this = std::move(other);
 }
 
+// Moving a list keeps iterators to its elements valid, but not its end.
 PipelineRecording& PipelineRecording::operator=(PipelineRecording&& other) noexcept {
     if (this == &other) return *this;
     pipeline = std::move(other.pipeline);
