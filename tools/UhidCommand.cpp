@@ -72,14 +72,10 @@ void runUhid(const UhidOptions& options) {
     surfaceOptions.name = options.name;
     surfaceOptions.vendor = options.vendor;
     surfaceOptions.product = options.product;
-    surfaceOptions.featureReports = VirtualSurface::defaultFeatureReports();
-    for (const auto& option : options.features) {
-        try {
-            auto [id, bytes] = VirtualSurface::featureFromOption(option);
-            surfaceOptions.featureReports[id] = bytes;
-        } catch (const std::invalid_argument& error) {
-            throw ToolError("--feature", error.what());
-        }
+    try {
+        surfaceOptions.featureReports = VirtualSurface::featureReportsWith(options.features);
+    } catch (const std::invalid_argument& error) {
+        throw ToolError("--feature", error.what());
     }
     for (int id : options.failingReports) surfaceOptions.failingReports.insert(static_cast<uint8_t>(id));
 

@@ -65,6 +65,15 @@ uint8_t VirtualSurface::reportIDFromText(const std::string& text) {
     return static_cast<uint8_t>(value);
 }
 
+std::map<uint8_t, std::vector<uint8_t>> VirtualSurface::featureReportsWith(const std::vector<std::string>& options) {
+    auto reports = defaultFeatureReports();
+    for (const auto& option : options) {
+        auto [id, bytes] = featureFromOption(option);
+        reports[id] = std::move(bytes);
+    }
+    return reports;
+}
+
 std::pair<uint8_t, std::vector<uint8_t>> VirtualSurface::featureFromOption(const std::string& option) {
     auto equals = option.find('=');
     if (equals == std::string::npos) throw std::invalid_argument("expected ID=HEX, got " + option);

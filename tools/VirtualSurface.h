@@ -50,6 +50,9 @@ public:
     // Throws std::invalid_argument with a one-line message.
     static std::pair<uint8_t, std::vector<uint8_t>> featureFromOption(const std::string& option);
 
+    // The default answers with each "ID=HEX" option laid over them. Throws std::invalid_argument.
+    static std::map<uint8_t, std::vector<uint8_t>> featureReportsWith(const std::vector<std::string>& options);
+
     // A report ID written in decimal or 0x hex, 1 to 255. Throws std::invalid_argument.
     static uint8_t reportIDFromText(const std::string& text);
 

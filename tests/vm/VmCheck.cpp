@@ -199,11 +199,7 @@ void checkHidraw(const std::string& node, const std::string& documentPath, const
         }
     }
 
-    auto answers = VirtualSurface::defaultFeatureReports();
-    for (const auto& feature : features) {
-        auto [id, bytes] = VirtualSurface::featureFromOption(feature);
-        answers[id] = bytes;
-    }
+    auto answers = VirtualSurface::featureReportsWith(features);
     std::vector<uint8_t> failingIDs;
     for (const auto& text : failing) failingIDs.push_back(VirtualSurface::reportIDFromText(text));
     for (const auto& [id, bytes] : answers) {
@@ -509,11 +505,7 @@ std::string readText(const std::string& path) {
 
 void checkProps(const std::string& firmwareFile, const std::string& holdFile, const std::vector<std::string>& features,
                 const std::vector<std::string>& failing) {
-    auto answers = VirtualSurface::defaultFeatureReports();
-    for (const auto& feature : features) {
-        auto [id, bytes] = VirtualSurface::featureFromOption(feature);
-        answers[id] = bytes;
-    }
+    auto answers = VirtualSurface::featureReportsWith(features);
     std::vector<uint8_t> failingIDs;
     for (const auto& text : failing) failingIDs.push_back(VirtualSurface::reportIDFromText(text));
 
