@@ -4,7 +4,7 @@ target_compile_options(tolka_options INTERFACE -Wall -Wextra)
 if(TOLKA_WARNINGS_AS_ERRORS)
   target_compile_options(tolka_options INTERFACE -Werror)
 endif()
-target_include_directories(tolka_options INTERFACE ${PROJECT_SOURCE_DIR})
+target_include_directories(tolka_options INTERFACE ${PROJECT_SOURCE_DIR} ${PROJECT_SOURCE_DIR}/include)
 
 # The recognition code's float results are part of its behaviour: the compiler
 # must not fuse multiplies and adds of its own accord.
