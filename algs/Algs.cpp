@@ -1,9 +1,11 @@
 #include "algs/Algs.h"
 
+#include <algorithm>
 #include <sstream>
 
-#include "pipeline/common/Util.h"
-#include "platform/Format.h"
+#include "algs/Descriptions.h"
+#include "common/Util.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 
@@ -13,12 +15,6 @@ constexpr const char* kSubsystem = "com.zantor.hid.TolkaTouch";
 constexpr const char* kCategory = "Algs";
 
 constexpr const char* kFactorsKey = "VirtualNormalizationFactors";
-
-double regionNumber(PixelRegion region) { return static_cast<double>(static_cast<uint32_t>(region)); }
-
-int regionInt(PixelRegion region) { return static_cast<int>(region); }
-
-const char* onMark(const Pixel& pixel) { return pixel.isOn ? "<==ON" : ""; }
 
 // The group index after "VirtualNormalizationFactors.", read as a stream reads an unsigned
 // number: white space skipped, digits up to the first other character, 0 when none. A leading
@@ -78,56 +74,56 @@ void Algs::processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint
         virtualPixels.at(i).updatePixelState(value, threshold, virtualImage.strongest.at(i));
     }
 
-    // 4. The hand state machine reads this frame's snapshot of both pixel lists.
+    // 4. The hand state machine reads this frame's snapshot of both pixel lists, and decides once
+    // what the frame did.
     handStats.updateHandState(pixels, virtualPixels, timeMs);
+    _verdict = handStats.verdict();
+    std::copy(readings, readings + kPixelCount, _readings.begin());
+    _frameNumber = frameNumber;
+    _timeMs = timeMs;
 
-    // 5. At most one event; the first rule that applies wins.
-    const HandStats& hand = handStats;
-    HIDEventRef event;
-    if (hand.touching && !hand.wasTouching) {
-        event = createMayBeginEvent(hand.activeRegion);
-    } else if (hand.holding && !hand.wasHolding) {
-        event = createHoldStartEvent(hand.activeRegion);
-    } else if (hand.holding && hand.wasHolding && hand.previousActiveRegion != hand.activeRegion) {
-        event = createHoldChangeEvent(hand.activeRegion);
-    } else if (!hand.holding && hand.wasHolding) {
-        event = createHoldEndEvent(hand.activeRegion);
-        Reset();
-    } else if (hand.tapDetected) {
-        event = createTapEvent(hand.activeRegion);
-        Reset();
-    } else if (!hand.touching && hand.wasTouching && lastEventPhase == static_cast<int16_t>(HIDEventPhase::MayBegin)) {
-        // Announced, but became neither a hold nor a tap.
-        event = createCancelEvent();
-        Reset();
-    } else if (!hand.touching && hand.wasTouching) {
-        Reset();
-    }
-
-    // 6.
-    if (event) {
+    // 5., 6. At most one event, chosen by the verdict.
+    if (HIDEventRef event = eventFor(_verdict)) {
         event->setIntegerValue(kDigitizerFrameNumberField, frameNumber);
         lastEventPhase = static_cast<int16_t>(event->phase);
         out.push_back(std::move(event));
     }
 
     // 7. Counted on every frame, with or without an event.
-    eventStats.update(handStats);
+    eventStats.update(_verdict);
 
     // 8. The diagnostic lines are costly; they are built only when someone reads them.
     if (log.debugEnabled()) {
-        if (log.debugEnabled()) {
-            log.debug("Frame %u @%ums, *** Event Stats ***\n%s", frameNumber, timeMs,
-                      eventStats.statsDictionary().description().c_str());
-        }
-        if (log.debugEnabled()) {
-            log.debug("Frame %u @%ums, *** Touch State Description ***\n%s", frameNumber, timeMs,
-                      touchStateDescription(readings, timeMs).c_str());
-        }
-        if (log.debugEnabled()) {
-            log.debug("Frame %u @%ums, *** Virtual State Description ***\n%s", frameNumber, timeMs,
-                      virtualStateDescription(readings, timeMs).c_str());
-        }
+        log.debug("Frame %u @%ums, *** Event Stats ***\n%s", frameNumber, timeMs,
+                  eventStats.statsDictionary().description().c_str());
+        const FrameSnapshot frame = snapshot();
+        log.debug("Frame %u @%ums, *** Touch State Description ***\n%s", frameNumber, timeMs,
+                  touchStateLine(frame).c_str());
+        log.debug("Frame %u @%ums, *** Virtual State Description ***\n%s", frameNumber, timeMs,
+                  virtualStateLine(frame).c_str());
+    }
+}
+
+HIDEventRef Algs::eventFor(const FrameVerdict& verdict) {
+    switch (verdict.transition) {
+    case Transition::TouchBegan: return createMayBeginEvent(verdict.region);
+    case Transition::HoldBegan:
+    case Transition::HoldRecovered: return createHoldStartEvent(verdict.region);
+    case Transition::HoldMoved: return createHoldChangeEvent(verdict.region);
+    case Transition::HoldEnded:
+        Reset();
+        return createHoldEndEvent(verdict.region);
+    case Transition::TapAccepted:
+        Reset();
+        return createTapEvent(verdict.region);
+    case Transition::TapRejected:
+    case Transition::TouchEnded: {
+        // Announced, but became neither a hold nor a tap.
+        const bool announced = lastEventPhase == static_cast<int16_t>(HIDEventPhase::MayBegin);
+        Reset();
+        return announced ? createCancelEvent() : nullptr;
+    }
+    default: return nullptr;
     }
 }
 
@@ -170,109 +166,60 @@ void Algs::setState(const std::string& key, PropertyValue value) {
     }
 }
 
-std::string Algs::touchPhaseDescription(uint32_t timeMs) const {
-    const HandStats& hand = handStats;
-    // Signed 32-bit durations; all but a rejected tap are measured to the recorded end of the touch.
-    const int sinceStart = static_cast<int32_t>(timeMs - hand.touchStartTime);
-    const int touchLength = static_cast<int32_t>(hand.touchEndTime - hand.touchStartTime);
-    const int region = regionInt(hand.activeRegion);
-    const char* noise = hand.isAboveNoise ? "ABOVENOISE" : "BELOWNOISE";
+FrameSnapshot Algs::snapshot() const { return snapshotOf(_readings.data(), _frameNumber, _timeMs); }
 
-    if (hand.touching && !hand.wasTouching) return formatString("STARTTOUCH %dms ActiveRegion=%d", sinceStart, region);
-    if (hand.holding && hand.wasHolding) return formatString("HOLDING %dms ActiveRegion=%d", sinceStart, region);
-    if (hand.holding && !hand.wasHolding) return formatString("STARTHOLD %dms ActiveRegion=%d", sinceStart, region);
-    if (hand.isHoldSuppressed) return formatString("SUPPRESSHOLD %dms ActiveRegion=%d", sinceStart, region);
-    if (hand.touching) return formatString("TOUCHING %dms ActiveRegion=%d", sinceStart, region);
-    if (hand.wasHolding) return formatString("ENDHOLD %dms ActiveRegion=%d %s", touchLength, region, noise);
-    if (hand.tapCandidate && hand.tapDetected) {
-        return formatString("TAP %dms ActiveRegion=%d %s", touchLength, region, noise);
+FrameSnapshot Algs::snapshotOf(const int16_t* readings, uint32_t frameNumber, uint32_t timeMs) const {
+    const HandStats& hand = handStats;
+    FrameSnapshot frame;
+    frame.frameNumber = frameNumber;
+    frame.timeMs = timeMs;
+    for (size_t i = 0; i < kPixelCount; ++i) {
+        frame.readings[i] = readings[i];
+        frame.pixelValues[i] = pixels[i].value;
+        frame.pixelNormalized[i] = pixels[i].normalized;
+        frame.pixelOn[i] = pixels[i].isOn;
     }
-    if (hand.tapCandidate && !hand.tapDetected) {
-        return formatString("SUPPRESSTAP %dms ActiveRegion=%d %s", sinceStart, region, noise);
+    for (size_t i = 0; i < kVirtualPixelCount; ++i) {
+        frame.virtualValues[i] = virtualPixels.at(i).value;
+        frame.virtualNormalized[i] = virtualPixels[i].normalized;
+        frame.virtualOn[i] = virtualPixels[i].isOn;
     }
-    if (hand.tapDetected) return formatString("TAP %dms ActiveRegion=%d %s", touchLength, region, noise);
-    if (hand.wasTouching) return formatString("ENDTOUCH %dms ActiveRegion=%d %s", touchLength, region, noise);
-    return std::string();
+    frame.touchScore = hand.touchScore;
+    frame.svmScore = hand.svm.score;
+    frame.strengthRate = hand.strengthRate;
+    frame.strengthPerDuration = hand.strengthPerDuration;
+    frame.durationRatio = hand.durationRatio;
+    frame.activePixelCount = hand.activePixelCount;
+    frame.tapScore = hand.tapScore;
+    frame.touching = hand.touching;
+    frame.aboveNoise = hand.isAboveNoise;
+    // Signed 32-bit durations, as the firmware clock wraps.
+    frame.sinceTouchStartMs = static_cast<int32_t>(timeMs - hand.touchStartTime);
+    frame.touchLengthMs = static_cast<int32_t>(hand.touchEndTime - hand.touchStartTime);
+    frame.verdict = hand.verdict();
+    return frame;
 }
 
 std::string Algs::touchStateDescription(const int16_t* readings, uint32_t timeMs) const {
-    const HandStats& h = handStats;
-    const auto& p = pixels;
-    const auto letter = [&](size_t i) { return 'A' + p.at(i).index; };
-    return formatString(
-        "ts=%f, sd=%f, tsd=%f, NonActivePixels=%d, TimeDurationRatio=%f, TapSVMScore=%f, "
-        "[%c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, "
-        "%c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, %c=%4d %4d%s, "
-        "%c=%4d %4d%s] %s",
-        static_cast<double>(h.touchScore), static_cast<double>(h.strengthRate),
-        static_cast<double>(h.strengthPerDuration), h.activePixelCount, static_cast<double>(h.durationRatio),
-        static_cast<double>(h.tapScore),
-        letter(0), readings[0], p.at(0).value, onMark(p.at(0)),
-        letter(1), readings[1], p.at(1).value, onMark(p.at(1)),
-        letter(2), readings[2], p.at(2).value, onMark(p.at(2)),
-        letter(3), readings[3], p.at(3).value, onMark(p.at(3)),
-        letter(4), readings[4], p.at(4).value, onMark(p.at(4)),
-        letter(5), readings[5], p.at(5).value, onMark(p.at(5)),
-        letter(6), readings[6], p.at(6).value, onMark(p.at(6)),
-        letter(7), readings[7], p.at(7).value, onMark(p.at(7)),
-        letter(8), readings[8], p.at(8).value, onMark(p.at(8)),
-        letter(9), readings[9], p.at(9).value, onMark(p.at(9)),
-        letter(10), readings[10], p.at(10).value, onMark(p.at(10)),
-        letter(11), readings[11], p.at(11).value, onMark(p.at(11)),
-        letter(12), readings[12], p.at(12).value, onMark(p.at(12)),
-        letter(13), readings[13], p.at(13).value, onMark(p.at(13)),
-        letter(14), readings[14], p.at(14).value, onMark(p.at(14)),
-        touchPhaseDescription(timeMs).c_str());
+    return touchStateLine(snapshotOf(readings, _frameNumber, timeMs));
 }
 
-std::string Algs::virtualStateDescription(const int16_t* /*readings: not shown*/, uint32_t timeMs) const {
-    const HandStats& h = handStats;
-    const auto& v = virtualPixels;
-    const auto name = [&](size_t i) { return v.at(i).name.c_str(); };
-    return formatString(
-        "ts=%f, sd=%f, tsd=%f, NonActivePixels=%d, TimeDurationRatio=%f, TapSVMScore=%f, "
-        "[%s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, "
-        "%s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, %s=%4d%s, "
-        "%s=%4d%s, %s=%4d%s, %s=%4d%s] %s",
-        static_cast<double>(h.touchScore), static_cast<double>(h.strengthRate),
-        static_cast<double>(h.strengthPerDuration), h.activePixelCount, static_cast<double>(h.durationRatio),
-        static_cast<double>(h.tapScore),
-        name(0), v.at(0).value, onMark(v.at(0)), name(1), v.at(1).value, onMark(v.at(1)),
-        name(2), v.at(2).value, onMark(v.at(2)), name(3), v.at(3).value, onMark(v.at(3)),
-        name(4), v.at(4).value, onMark(v.at(4)), name(5), v.at(5).value, onMark(v.at(5)),
-        name(6), v.at(6).value, onMark(v.at(6)), name(7), v.at(7).value, onMark(v.at(7)),
-        name(8), v.at(8).value, onMark(v.at(8)), name(9), v.at(9).value, onMark(v.at(9)),
-        name(10), v.at(10).value, onMark(v.at(10)), name(11), v.at(11).value, onMark(v.at(11)),
-        name(12), v.at(12).value, onMark(v.at(12)), name(13), v.at(13).value, onMark(v.at(13)),
-        name(14), v.at(14).value, onMark(v.at(14)), name(15), v.at(15).value, onMark(v.at(15)),
-        name(16), v.at(16).value, onMark(v.at(16)), name(17), v.at(17).value, onMark(v.at(17)),
-        name(18), v.at(18).value, onMark(v.at(18)), name(19), v.at(19).value, onMark(v.at(19)),
-        name(20), v.at(20).value, onMark(v.at(20)), name(21), v.at(21).value, onMark(v.at(21)),
-        name(22), v.at(22).value, onMark(v.at(22)),
-        touchPhaseDescription(timeMs).c_str());
+std::string Algs::virtualStateDescription(const int16_t* readings, uint32_t timeMs) const {
+    return virtualStateLine(snapshotOf(readings, _frameNumber, timeMs));
 }
 
-HIDEventRef Algs::createMayBeginEvent(PixelRegion region) {
-    return makeDigitizerEvent(0, HIDEventPhase::MayBegin, regionNumber(region));
-}
+HIDEventRef Algs::createMayBeginEvent(PixelRegion region) { return GestureCodec::encode(GestureKind::MayBegin, region); }
 
-HIDEventRef Algs::createHoldStartEvent(PixelRegion region) {
-    return makeDigitizerEvent(2, HIDEventPhase::Began, regionNumber(region));
-}
+HIDEventRef Algs::createHoldStartEvent(PixelRegion region) { return GestureCodec::encode(GestureKind::HoldStart, region); }
 
 HIDEventRef Algs::createHoldChangeEvent(PixelRegion region) {
-    return makeDigitizerEvent(2, HIDEventPhase::Changed, regionNumber(region));
+    return GestureCodec::encode(GestureKind::HoldChange, region);
 }
 
-HIDEventRef Algs::createHoldEndEvent(PixelRegion region) {
-    return makeDigitizerEvent(2, HIDEventPhase::Ended, regionNumber(region));
-}
+HIDEventRef Algs::createHoldEndEvent(PixelRegion region) { return GestureCodec::encode(GestureKind::HoldEnd, region); }
 
-HIDEventRef Algs::createTapEvent(PixelRegion region) {
-    // Created without a phase on purpose: it reads back as 0.
-    return makeDigitizerEvent(0x20000, HIDEventPhase::None, regionNumber(region));
-}
+HIDEventRef Algs::createTapEvent(PixelRegion region) { return GestureCodec::encode(GestureKind::Tap, region); }
 
-HIDEventRef Algs::createCancelEvent() { return makeDigitizerEvent(0, HIDEventPhase::Cancelled, 0.0); }
+HIDEventRef Algs::createCancelEvent() { return GestureCodec::encode(GestureKind::Cancel); }
 
 }  // namespace TolkaTouch

@@ -13,10 +13,11 @@
 #include "algs/Pixel.h"
 #include "algs/VirtualImage.h"
 #include "algs/VirtualPixel.h"
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 #include "platform/HIDEvent.h"
 #include "platform/Log.h"
 #include "platform/PropertyValue.h"
+#include "tolkatouch/FrameSnapshot.h"
 
 namespace TolkaTouch {
 
@@ -41,6 +42,11 @@ public:
     PropertyValue getState(const std::string& key) const;
     void setState(const std::string& key, PropertyValue value);
 
+    // What the last frame did, and every number it left: what the counters, the description
+    // lines, evaluation and plots read.
+    const FrameVerdict& verdict() const { return _verdict; }
+    FrameSnapshot snapshot() const;
+
     // One line each of the state a frame left, for people tuning the recognizer.
     std::string touchStateDescription(const int16_t* readings, uint32_t timeMs) const;
     std::string virtualStateDescription(const int16_t* readings, uint32_t timeMs) const;
@@ -62,7 +68,13 @@ public:
     int16_t lastEventPhase = 0;  // phase of the last event emitted
 
 private:
-    std::string touchPhaseDescription(uint32_t timeMs) const;
+    FrameSnapshot snapshotOf(const int16_t* readings, uint32_t frameNumber, uint32_t timeMs) const;
+    HIDEventRef eventFor(const FrameVerdict& verdict);
+
+    FrameVerdict _verdict;
+    std::array<int16_t, kPixelCount> _readings{};  // of the last frame
+    uint32_t _frameNumber = 0;
+    uint32_t _timeMs = 0;
 };
 
 }  // namespace TolkaTouch

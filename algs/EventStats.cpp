@@ -2,64 +2,83 @@
 
 #include <utility>
 
-#include "algs/HandStats.h"
 
 namespace TolkaTouch {
 
 void EventStats::Reset() { *this = EventStats(); }
 
-void EventStats::update(const HandStats& hand) {
-    const PixelRegion r = hand.activeRegion;
+void EventStats::update(const FrameVerdict& verdict) {
+    const PixelRegion r = verdict.region;
     constexpr PixelRegion kRegion1 = PixelRegion::PlayPause;
     constexpr PixelRegion kRegion2 = PixelRegion::VolumeDown;
     constexpr PixelRegion kRegion3 = PixelRegion::VolumeUp;
+    const Transition t = verdict.transition;
+    const bool heldBefore = t == Transition::Holding || t == Transition::HoldMoved || t == Transition::HoldEnded;
 
     // Nothing is counted in the frame a touch starts.
-    if (hand.touching && !hand.wasTouching) return;
+    if (t == Transition::TouchBegan) return;
 
-    if (hand.isHoldSuppressed) {
-        // 1. A suppressed hold.
-        if (hand.wasHolding) ++numHolding2Suppressed;
-        if (!hand.holdTimeExceeded) {
+    if (verdict.holdSuppressed) {
+        // 1. A suppressed hold, counted every frame it lasts.
+        if (heldBefore) ++numHolding2Suppressed;
+        switch (verdict.holdClock) {
+        case HoldClock::Before:
+        case HoldClock::Dropped:
             if (r == kRegion2) ++numRejectedVolumeDecrement;
             if (r == kRegion3) ++numRejectedVolumeIncrement;
-        } else if (hand.wasHoldTimeExceeded) {
+            break;
+        case HoldClock::Past:
             ++numRejectedIncrementHold;
             if (r == kRegion2) ++numRejectedVolumeDecrement;
             if (r == kRegion1) ++numRejectedKalioCallIncrement;
             if (r == kRegion3) ++numRejectedVolumeIncrement;
-        } else {
-            // The hold timeout passed in this frame.
+            break;
+        case HoldClock::Reached:
             ++numRejectedBeginHold;
             if (r == kRegion2) ++numRejectedVolumeDecrement;
             if (r == kRegion1) ++numRejectedKalioCall;
             if (r == kRegion3) ++numRejectedVolumeIncrement;
+            break;
         }
-    } else if (hand.holding) {
+        return;
+    }
+
+    switch (t) {
+    case Transition::HoldRecovered:
+        ++numSuppressed2Holding;
+        [[fallthrough]];
+    case Transition::HoldBegan:
         // 2. A hold, counted every frame it lasts.
-        if (hand.wasHolding) {
-            ++numIncrementHold;
-            if (r == kRegion1) ++numKalioCallIncrement;
-        } else {
-            if (hand.wasHoldSuppressed) ++numSuppressed2Holding;
-            ++numBeginHold;
-            if (r == kRegion1) ++numKalioCall;
-        }
+        ++numBeginHold;
+        if (r == kRegion1) ++numKalioCall;
         if (r == kRegion2) ++numVolumeDecrement;
         if (r == kRegion3) ++numVolumeIncrement;
-    } else if (hand.wasHolding) {
+        return;
+    case Transition::Holding:
+    case Transition::HoldMoved:
+        ++numIncrementHold;
+        if (r == kRegion1) ++numKalioCallIncrement;
+        if (r == kRegion2) ++numVolumeDecrement;
+        if (r == kRegion3) ++numVolumeIncrement;
+        return;
+    case Transition::HoldEnded:
         // 3. The hold ended.
         ++numEndHold;
-    } else if (!hand.holdTimeExceeded && hand.wasHoldTimeExceeded) {
+        return;
+    default:
+        break;
+    }
+
+    if (verdict.holdClock == HoldClock::Dropped) {
         // 4. A suppressed hold ended ...
         ++numRejectedEndHold;
-    } else if (hand.tapDetected) {
+    } else if (t == Transition::TapAccepted) {
         // ... or a tap stands ...
         ++numTaps;
         if (r == kRegion1) ++numPlayPause;
         if (r == kRegion2) ++numVolumeDown;
         if (r == kRegion3) ++numVolumeUp;
-    } else if (hand.tapCandidate) {
+    } else if (t == Transition::TapRejected) {
         // ... or was rejected.
         ++numRejectedTap;
         if (r == kRegion1) ++numRejectedPlayPause;

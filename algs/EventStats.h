@@ -5,10 +5,9 @@
 #include <cstdint>
 
 #include "platform/PropertyValue.h"
+#include "tolkatouch/FrameSnapshot.h"
 
 namespace TolkaTouch {
-
-class HandStats;
 
 class EventStats {
 public:
@@ -16,9 +15,9 @@ public:
 
     // All counters back to 0.
     void Reset();
-    // Adds this frame's outcome. Region 1 is play/pause (tap) and the voice-assistant call (hold),
-    // region 2 volume down, region 3 volume up.
-    void update(const HandStats& hand);
+    // Adds this frame's outcome, as its verdict says. Region 1 is play/pause (tap) and the
+    // voice-assistant call (hold), region 2 volume down, region 3 volume up.
+    void update(const FrameVerdict& verdict);
     // {"Dispatched": {12 counters}, "Rejected": {12 counters}}, unsigned numbers.
     PropertyValue statsDictionary() const;
 

@@ -145,6 +145,40 @@ void HandStats::updateHandState(const std::vector<Pixel>& pixels, const std::vec
     }
 }
 
+FrameVerdict HandStats::verdict() const {
+    FrameVerdict verdict;
+    verdict.region = activeRegion;
+    verdict.holdSuppressed = isHoldSuppressed;
+    if (holdTimeExceeded) {
+        verdict.holdClock = wasHoldTimeExceeded ? HoldClock::Past : HoldClock::Reached;
+    } else {
+        verdict.holdClock = wasHoldTimeExceeded ? HoldClock::Dropped : HoldClock::Before;
+    }
+
+    // The first that applies wins; the order is the order in which the event is chosen.
+    Transition& t = verdict.transition;
+    if (touching && !wasTouching) {
+        t = Transition::TouchBegan;
+    } else if (holding && !wasHolding) {
+        t = wasHoldSuppressed ? Transition::HoldRecovered : Transition::HoldBegan;
+    } else if (holding && previousActiveRegion != activeRegion) {
+        t = Transition::HoldMoved;
+    } else if (!holding && wasHolding) {
+        t = Transition::HoldEnded;
+    } else if (tapDetected) {
+        t = Transition::TapAccepted;
+    } else if (!touching && wasTouching) {
+        t = tapCandidate ? Transition::TapRejected : Transition::TouchEnded;
+    } else if (holding) {
+        t = Transition::Holding;
+    } else if (touching) {
+        t = Transition::Touching;
+    } else {
+        t = Transition::Idle;
+    }
+    return verdict;
+}
+
 void HandStats::updateTouchScore(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
                                  unsigned int time) {
     // 1.

@@ -9,7 +9,8 @@
 #include "algs/Pixel.h"
 #include "algs/SVM.h"
 #include "algs/VirtualPixel.h"
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
+#include "tolkatouch/FrameSnapshot.h"
 
 namespace TolkaTouch {
 
@@ -24,6 +25,10 @@ public:
     void SetDecayParameters();
     // Clears the touch score and the strongest-on-pixel record between touches; nothing else.
     void Reset();
+
+    // What the frame just handled did to the touch: the one verdict from which the event, the
+    // counters and the description are chosen. Read it after updateHandState.
+    FrameVerdict verdict() const;
 
     // One frame at the firmware time `time` (ms). The pixels are this frame's snapshot; they are
     // only read.

@@ -4,7 +4,7 @@
 
 #include <cstdint>
 
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 
 namespace TolkaTouch {
 

@@ -1,5 +1,7 @@
 #include "algs/VirtualImage.h"
 
+#include "tolkatouch/FrameSnapshot.h"
+
 #include <algorithm>
 #include <array>
 #include <stdexcept>
@@ -37,6 +39,8 @@ const T& checkedAt(const std::vector<T>& vector, size_t i) {
 }
 
 }  // namespace
+
+const char* virtualPixelName(size_t i) { return kGroups.at(i).letters; }
 
 VirtualImage::VirtualImage() {
     values.assign(kGroups.size(), 0);

@@ -20,7 +20,7 @@
 #include "daemon/PluginLibrary.h"
 #include "daemon/SimulationFeeder.h"
 #include "daemon/UinputKeyOutput.h"
-#include "platform/HIDEventJson.h"
+#include "tolkatouch/Gesture.h"
 #include "platform/HIDServiceRegistry.h"
 #include "platform/HidrawDevice.h"
 #include "platform/RunLoop.h"
@@ -254,7 +254,7 @@ void Daemon::eventCallback(void* target, void* refcon, void*, const HIDEventRef&
 
 void Daemon::handleEvent(uint32_t service, const HIDEvent& event) {
     if (_options.print) {
-        std::string line = eventJsonLine(event);
+        std::string line = GestureCodec::jsonLine(event);
         line += '\n';
         std::fwrite(line.data(), 1, line.size(), _printOutput);
         std::fflush(_printOutput);

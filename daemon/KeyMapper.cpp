@@ -2,13 +2,11 @@
 
 #include <linux/input-event-codes.h>
 
+#include "tolkatouch/Gesture.h"
+
 namespace TolkaTouch {
 
 namespace {
-constexpr uint32_t kTapEventMask = 0x20000;
-constexpr uint32_t kResetUsagePage = 0xFF60;
-constexpr uint32_t kResetUsage = 2;
-
 std::optional<uint16_t> tapKey(uint32_t region) {
     switch (region) {
     case 1: return KEY_PLAYPAUSE;
@@ -26,43 +24,37 @@ std::optional<uint16_t> holdVolumeKey(uint32_t region) {
     }
 }
 
-uint32_t regionOf(const HIDEvent& event) {
-    return event.y >= 0.0 && event.y < 16.0 ? static_cast<uint32_t>(event.y) : 0;
-}
 }  // namespace
 
 KeyMapper::KeyMapper(KeyOutput& output, Clock clock) : _output(output), _clock(std::move(clock)) {}
 
 void KeyMapper::handleEvent(const HIDEvent& event) {
-    if (event.type == HIDEventType::VendorDefined) {
-        if (event.usagePage == kResetUsagePage && event.usage == kResetUsage) {
-            _log.log("the surface's firmware reported a reset");
-        }
-        return;
-    }
-    if (event.type != HIDEventType::Digitizer) return;
-
-    if (event.eventMask == kTapEventMask) {
-        if (auto key = tapKey(regionOf(event))) pressAndRelease(*key);
-        return;
-    }
-    switch (event.phase) {
-    case HIDEventPhase::Began:
+    const std::optional<Gesture> gesture = GestureCodec::decode(event);
+    if (!gesture) return;
+    const auto region = static_cast<uint32_t>(gesture->region);
+    switch (gesture->kind) {
+    case GestureKind::Reset:
+        _log.log("the surface's firmware reported a reset");
+        break;
+    case GestureKind::Tap:
+        if (auto key = tapKey(region)) pressAndRelease(*key);
+        break;
+    case GestureKind::HoldStart:
         releaseAll();
-        if (regionOf(event) == 1) {
+        if (gesture->region == PixelRegion::PlayPause) {
             pressAndRelease(KEY_VOICECOMMAND);
         } else {
-            holdRegion(regionOf(event));
+            holdRegion(region);
         }
         break;
-    case HIDEventPhase::Changed:
-        holdRegion(regionOf(event));
+    case GestureKind::HoldChange:
+        holdRegion(region);
         break;
-    case HIDEventPhase::Ended:
-    case HIDEventPhase::Cancelled:
+    case GestureKind::HoldEnd:
+    case GestureKind::Cancel:
         releaseAll();
         break;
-    default:  // may-begin announces a touch; nothing to press yet
+    case GestureKind::MayBegin:  // announces a touch; nothing to press yet
         break;
     }
 }

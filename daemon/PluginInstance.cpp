@@ -22,7 +22,7 @@ PluginInstance::PluginInstance(const PluginLibrary& library, uint32_t service, c
 
     void* interface = nullptr;
     Host::Result result = (*_plugin)->QueryInterface(_plugin, Host::kHIDServiceInterfaceID, &interface);
-    if (result != Host::kResultSuccess || !interface) {
+    if (result != HIDResult::Success || !interface) {
         undo();
         throw std::runtime_error("the plug-in offers no HID service interface (" + hex(result) + ")");
     }
@@ -30,13 +30,13 @@ PluginInstance::PluginInstance(const PluginLibrary& library, uint32_t service, c
 
     int32_t score = 0;
     result = (*_plugin)->Probe(_plugin, &matching, service, &score);
-    if (result != Host::kResultSuccess) {
+    if (result != HIDResult::Success) {
         undo();
         throw std::runtime_error("probe of " + name + " failed (" + hex(result) + ")");
     }
     result = (*_plugin)->Start(_plugin, &matching, service);
     _started = true;  // a failed start is still followed by stop, as the service expects
-    if (result != Host::kResultSuccess) {
+    if (result != HIDResult::Success) {
         undo();
         throw std::runtime_error("start of " + name + " failed (" + hex(result) + ")");
     }

@@ -5,8 +5,8 @@
 #include <cstdlib>
 #include <vector>
 
-#include "pipeline/common/Reports.h"
-#include "pipeline/common/Util.h"
+#include "common/Reports.h"
+#include "common/Util.h"
 
 namespace {
 

@@ -2,7 +2,8 @@
 
 #include <utility>
 
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 
@@ -56,7 +57,7 @@ void Pipeline::handleFirmwareEvent(const InputReport::FirmwareEvent& event) {
     ++resetCount;
     // An all-zero frame lets the recognizer end a touch that was in progress at the reset.
     EventList events = algs.handleReset();
-    events.push_back(makeFirmwareResetEvent());
+    events.push_back(GestureCodec::encode(GestureKind::Reset));
     handleHIDEvents(events);
     // The frame counter is left alone: a firmware that restarts its numbering after a reset is
     // counted once as disjoint.

@@ -21,7 +21,7 @@
 #include "algs/Algs.h"
 #include "pipeline/PipelineInput.h"
 #include "pipeline/PipelineOutput.h"
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 #include "platform/HIDEvent.h"
 #include "platform/PropertyValue.h"
 

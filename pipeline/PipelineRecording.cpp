@@ -4,7 +4,7 @@
 #include <unordered_set>
 #include <utility>
 
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 namespace TolkaTouch {
 

@@ -10,7 +10,7 @@
 
 #include "pipeline/PipelineRecording.h"
 #include "platform/PropertyValueJson.h"
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 namespace TolkaTouch {
 

@@ -5,7 +5,7 @@
 #include <stdexcept>
 
 #include "pipeline/PipelineRecording.h"
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 namespace TolkaTouch {
 

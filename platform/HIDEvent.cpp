@@ -38,12 +38,12 @@ HIDEventRef makeDigitizerEvent(uint32_t eventMask, uint32_t phase, double y) {
     return event;
 }
 
-HIDEventRef makeFirmwareResetEvent() {
+HIDEventRef makeVendorDefinedEvent(uint32_t usagePage, uint32_t usage) {
     auto event = std::make_shared<HIDEvent>();
     event->type = HIDEventType::VendorDefined;
     event->transducerType = 0;
-    event->usagePage = 0xFF60;
-    event->usage = 2;
+    event->usagePage = usagePage;
+    event->usage = usage;
     event->version = 0;
     return event;
 }

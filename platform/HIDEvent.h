@@ -70,7 +70,7 @@ using EventList = std::vector<HIDEventRef>;
 // A digitizer event with the common defaults: finger, everything zero but mask, phase and y.
 HIDEventRef makeDigitizerEvent(uint32_t eventMask, uint32_t phase, double y);
 
-// The vendor-defined event that announces a firmware reset (usage page 0xFF60, usage 2).
-HIDEventRef makeFirmwareResetEvent();
+// A vendor-defined event of a usage page and usage, everything else zero.
+HIDEventRef makeVendorDefinedEvent(uint32_t usagePage, uint32_t usage);
 
 }  // namespace TolkaTouch

@@ -29,6 +29,7 @@
 
 #include "platform/DispatchQueue.h"
 #include "platform/HIDEvent.h"
+#include "platform/HIDResult.h"
 #include "platform/PropertyValue.h"
 
 namespace TolkaTouch::Host {
@@ -62,12 +63,10 @@ inline constexpr UUIDBytes kHIDServicePlugInTypeID = {
 inline constexpr UUIDBytes kHIDServiceInterfaceID = {
     {0x60, 0x20, 0x10, 0x7F, 0x1B, 0x90, 0x48, 0x0C, 0x86, 0x8A, 0x0B, 0xFB, 0x41, 0x63, 0xF6, 0xB8}};
 
-// 32-bit result codes of the interface operations.
+// 32-bit result codes of the interface operations: HIDResult (platform/HIDResult.h), the same set
+// the device handle answers. QueryInterface answers NoInterface for an interface it lacks; start
+// answers NotCreated when the device handle could not be created.
 using Result = uint32_t;
-inline constexpr Result kResultSuccess = 0;
-inline constexpr Result kResultNoInterface = 0x80000004;    // QueryInterface: interface not supported
-inline constexpr Result kResultUnsupported = 0xE00002C7;    // operation not supported
-inline constexpr Result kResultNotCreated = 0xE00002BE;     // start: the device handle was not created
 
 // The host's event callback: called on the host's dispatch queue, once per event, in order.
 // `sender` is the service's HID service interface handle; `options` is 0. The callback may keep

@@ -77,15 +77,15 @@ TolkaHIDService* TolkaHIDService::fromInterface(void* handle) {
 }
 
 Host::Result TolkaHIDService::probeWithService(uint32_t, const PropertyValue*, int32_t*) {
-    return Host::kResultUnsupported;
+    return HIDResult::Unsupported;
 }
 
 Host::Result TolkaHIDService::startWithService(uint32_t, const PropertyValue*) {
-    return Host::kResultUnsupported;
+    return HIDResult::Unsupported;
 }
 
 Host::Result TolkaHIDService::stop() {
-    return Host::kResultUnsupported;
+    return HIDResult::Unsupported;
 }
 
 bool TolkaHIDService::openWithOptions(uint32_t) {
@@ -113,7 +113,7 @@ HIDEventRef TolkaHIDService::copyEventWithType(uint32_t, const HIDEventRef&, uin
 }
 
 Host::Result TolkaHIDService::setOutputEvent(const HIDEventRef&) {
-    return Host::kResultUnsupported;
+    return HIDResult::Unsupported;
 }
 
 }  // namespace TolkaTouch

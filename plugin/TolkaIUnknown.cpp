@@ -1,6 +1,7 @@
 #include "plugin/TolkaIUnknown.h"
 
 #include <exception>
+#include <type_traits>
 
 #include "platform/Log.h"
 #include "plugin/TolkaHIDService.h"
@@ -13,8 +14,6 @@ TolkaHIDService* serviceOf(void* self) {
     return TolkaHIDService::fromInterface(self);
 }
 
-// A host operation must not let an exception reach the host's code: it is logged and the
-// operation answers its "not supported" value.
 void logEscapedException(const char* operation) {
     Log log("com.zantor.hid.TolkaTouch", "HIDService");
     try {
@@ -23,6 +22,23 @@ void logEscapedException(const char* operation) {
         log.error("%s failed: %s", operation, e.what());
     } catch (...) {
         log.error("%s failed", operation);
+    }
+}
+
+// What a table slot that answers nothing answers when its operation fails.
+struct Nothing {};
+constexpr Nothing kNothing;
+
+// Runs one host operation. An exception must not reach the host's code: it is logged under the
+// operation's selector and the slot answers `failure` instead.
+template <typename Failure, typename Call>
+auto shielded(const char* selector, [[maybe_unused]] Failure failure, Call&& call) -> std::invoke_result_t<Call> {
+    using Answer = std::invoke_result_t<Call>;
+    try {
+        return call();
+    } catch (...) {
+        logEscapedException(selector);
+        if constexpr (!std::is_void_v<Answer>) return Answer(failure);
     }
 }
 
@@ -51,10 +67,10 @@ Host::Result QueryInterface(void* self, Host::UUIDBytes interfaceID, void** outI
     } else if (interfaceID == Host::kHIDServiceInterfaceID) {
         *outInterface = service->getServiceInterface();
     } else {
-        return Host::kResultNoInterface;
+        return HIDResult::NoInterface;
     }
     service->retain();
-    return Host::kResultSuccess;
+    return HIDResult::Success;
 }
 
 // The count is read while the temporary reference is held, so the answer is one above what
@@ -82,107 +98,60 @@ uint32_t Release(void* self) {
 }
 
 Host::Result Probe(void* self, const PropertyValue* matchingProperties, uint32_t service, int32_t* outScore) {
-    try {
-        return serviceOf(self)->probeWithService(service, matchingProperties, outScore);
-    } catch (...) {
-        logEscapedException("probeWithService:properties:outScore:");
-        return Host::kResultUnsupported;
-    }
+    return shielded("probeWithService:properties:outScore:", HIDResult::Unsupported,
+                    [&] { return serviceOf(self)->probeWithService(service, matchingProperties, outScore); });
 }
 
 Host::Result Start(void* self, const PropertyValue* properties, uint32_t service) {
-    try {
-        return serviceOf(self)->startWithService(service, properties);
-    } catch (...) {
-        logEscapedException("startWithService:properties:");
-        return Host::kResultUnsupported;
-    }
+    return shielded("startWithService:properties:", HIDResult::Unsupported,
+                    [&] { return serviceOf(self)->startWithService(service, properties); });
 }
 
 Host::Result Stop(void* self) {
-    try {
-        return serviceOf(self)->stop();
-    } catch (...) {
-        logEscapedException("stop");
-        return Host::kResultUnsupported;
-    }
+    return shielded("stop", HIDResult::Unsupported, [&] { return serviceOf(self)->stop(); });
 }
 
 bool open(void* self, uint32_t options) {
-    try {
-        return serviceOf(self)->openWithOptions(options);
-    } catch (...) {
-        logEscapedException("openWithOptions:");
-        return false;
-    }
+    return shielded("openWithOptions:", false, [&] { return serviceOf(self)->openWithOptions(options); });
 }
 
 void close(void* self, uint32_t options) {
-    try {
-        serviceOf(self)->closeWithOptions(options);
-    } catch (...) {
-        logEscapedException("closeWithOptions:");
-    }
+    shielded("closeWithOptions:", kNothing, [&] { serviceOf(self)->closeWithOptions(options); });
 }
 
 PropertyValue copyProperty(void* self, const char* key) {
-    try {
-        return serviceOf(self)->getPropertyForKey(key);
-    } catch (...) {
-        logEscapedException("getPropertyForKey:");
-        return {};
-    }
+    return shielded("getPropertyForKey:", PropertyValue(), [&] { return serviceOf(self)->getPropertyForKey(key); });
 }
 
 bool setProperty(void* self, const char* key, const PropertyValue* value) {
-    try {
-        return serviceOf(self)->setProperty(value ? *value : PropertyValue(), key);
-    } catch (...) {
-        logEscapedException("setProperty:forKey:");
-        return false;
-    }
+    return shielded("setProperty:forKey:", false,
+                    [&] { return serviceOf(self)->setProperty(value ? *value : PropertyValue(), key); });
 }
 
 void setEventCallback(void* self, Host::HIDEventCallback callback, void* target, void* refcon) {
-    try {
-        serviceOf(self)->setEventCallback(callback, target, refcon);
-    } catch (...) {
-        logEscapedException("setEventCallback:target:refcon:");
-    }
+    shielded("setEventCallback:target:refcon:", kNothing,
+             [&] { serviceOf(self)->setEventCallback(callback, target, refcon); });
 }
 
 void scheduleWithDispatchQueue(void* self, const DispatchQueueRef* queue) {
-    try {
-        serviceOf(self)->scheduleWithDispatchQueue(queue ? *queue : DispatchQueueRef());
-    } catch (...) {
-        logEscapedException("scheduleWithDispatchQueue:");
-    }
+    shielded("scheduleWithDispatchQueue:", kNothing,
+             [&] { serviceOf(self)->scheduleWithDispatchQueue(queue ? *queue : DispatchQueueRef()); });
 }
 
 void unscheduleFromDispatchQueue(void* self, const DispatchQueueRef* queue) {
-    try {
-        serviceOf(self)->unscheduleWithDispatchQueue(queue ? *queue : DispatchQueueRef());
-    } catch (...) {
-        logEscapedException("unscheduleWithDispatchQueue:");
-    }
+    shielded("unscheduleWithDispatchQueue:", kNothing,
+             [&] { serviceOf(self)->unscheduleWithDispatchQueue(queue ? *queue : DispatchQueueRef()); });
 }
 
 HIDEventRef copyEvent(void* self, uint32_t type, const HIDEventRef* matching, uint32_t options) {
-    try {
+    return shielded("copyEventWithType:matching:options:", HIDEventRef(), [&] {
         return serviceOf(self)->copyEventWithType(type, matching ? *matching : HIDEventRef(), options);
-    } catch (...) {
-        logEscapedException("copyEventWithType:matching:options:");
-        return nullptr;
-    }
+    });
 }
 
 Host::Result setOutputEvent(void* self, const HIDEventRef* event) {
-    try {
-        return serviceOf(self)->setOutputEvent(event ? *event : HIDEventRef());
-    } catch (...) {
-        logEscapedException("setOutputEvent:");
-        return Host::kResultUnsupported;
-    }
+    return shielded("setOutputEvent:", HIDResult::Unsupported,
+                    [&] { return serviceOf(self)->setOutputEvent(event ? *event : HIDEventRef()); });
 }
 
 }  // namespace TolkaTouch::TolkaIUnknown

@@ -31,19 +31,19 @@ TolkaTouchHIDService::~TolkaTouchHIDService() {
 Host::Result TolkaTouchHIDService::probeWithService(uint32_t, const PropertyValue*, int32_t*) {
     // The score stays unwritten: the host keeps its own default.
     _log.debug("%s", "probeWithService:properties:outScore:");
-    return Host::kResultSuccess;
+    return HIDResult::Success;
 }
 
 Host::Result TolkaTouchHIDService::startWithService(uint32_t service, const PropertyValue*) {
     _log.debug("%s", "startWithService:properties:");
     _tolkaDevice = HIDServiceRegistry::createDevice(service);
-    return _tolkaDevice ? Host::kResultSuccess : Host::kResultNotCreated;
+    return _tolkaDevice ? HIDResult::Success : HIDResult::NotCreated;
 }
 
 Host::Result TolkaTouchHIDService::stop() {
     _log.debug("%s", "stop");
     _tolkaDevice.reset();
-    return Host::kResultSuccess;
+    return HIDResult::Success;
 }
 
 bool TolkaTouchHIDService::openWithOptions(uint32_t options) {
@@ -161,7 +161,7 @@ HIDEventRef TolkaTouchHIDService::copyEventWithType(uint32_t, const HIDEventRef&
 
 Host::Result TolkaTouchHIDService::setOutputEvent(const HIDEventRef&) {
     _log.debug("%s", "setOutputEvent:");
-    return Host::kResultUnsupported;
+    return HIDResult::Unsupported;
 }
 
 }  // namespace TolkaTouch

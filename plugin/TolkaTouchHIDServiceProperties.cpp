@@ -3,8 +3,8 @@
 #include <array>
 #include <string>
 
-#include "pipeline/common/Reports.h"
-#include "pipeline/common/Util.h"
+#include "common/Reports.h"
+#include "common/Util.h"
 #include "platform/Format.h"
 #include "plugin/TolkaTouchHIDService.h"
 
@@ -69,7 +69,7 @@ PropertyValue TolkaTouchHIDService::firmwareDebugReports() {
         std::array<uint8_t, kFirmwareDebugReportLength> buffer{};
         size_t length = buffer.size();
         uint32_t result = _tolkaDevice ? _tolkaDevice->getReport(HIDReportType::Feature, reportID, buffer.data(), length)
-                                       : Host::kResultNotCreated;
+                                       : HIDResult::NotCreated;
         std::string name = formatString("0x%02jx", static_cast<uintmax_t>(reportID));
         if (result != HIDResult::Success) {
             reports[name] = formatString("Failed to get report ID 0x%jx: 0x%jx", static_cast<uintmax_t>(reportID),

@@ -3,20 +3,17 @@
 #include <cstdint>
 
 #include "platform/Format.h"
-#include "platform/HIDEventJson.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch::Tools {
-
-namespace {
-
-bool isHoldKind(std::string_view kind) { return kind.starts_with("hold-"); }
-
-}  // namespace
 
 std::string_view eventButtonName(const HIDEvent& event) {
     if (event.type != HIDEventType::Digitizer) return {};
     switch (static_cast<int64_t>(event.y)) {
-    case 1: return isHoldKind(eventKindName(event)) ? "voice assistant" : "play/pause";
+    case 1: {
+        const auto gesture = GestureCodec::decode(event);
+        return gesture && GestureCodec::isHold(gesture->kind) ? "voice assistant" : "play/pause";
+    }
     case 2: return "volume down";
     case 3: return "volume up";
     default: return {};
@@ -24,7 +21,7 @@ std::string_view eventButtonName(const HIDEvent& event) {
 }
 
 std::string eventHumanLine(const HIDEvent& event, double secondsSinceStart) {
-    const std::string kind(eventKindName(event));
+    const std::string kind(GestureCodec::kindName(event));
     if (event.type != HIDEventType::Digitizer) {
         return formatString("%7.3fs  frame %-4s  %s", secondsSinceStart, "-", kind.c_str());
     }

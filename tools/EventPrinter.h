@@ -1,6 +1,6 @@
 #pragma once
 // The text form of the events the pipeline hands out for people: one aligned line per event.
-// The JSON form for programs is platform/HIDEventJson.h.
+// The JSON form for programs is GestureCodec::jsonLine (tolkatouch/Gesture.h).
 
 #include <string>
 #include <string_view>

@@ -6,7 +6,7 @@
 #include <string_view>
 
 #include "algs/Algs.h"
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 namespace TolkaTouch::Tools {
 

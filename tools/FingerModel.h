@@ -15,7 +15,7 @@
 #include <optional>
 #include <vector>
 
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 #include "tools/GestureScript.h"
 #include "tools/SeededRandom.h"
 

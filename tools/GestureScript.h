@@ -22,7 +22,7 @@
 #include <string_view>
 #include <vector>
 
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 #include "platform/PropertyValue.h"
 
 namespace TolkaTouch::Tools {

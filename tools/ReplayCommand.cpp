@@ -7,7 +7,7 @@
 
 #include <CLI/CLI.hpp>
 
-#include "platform/HIDEventJson.h"
+#include "tolkatouch/Gesture.h"
 #include "platform/Log.h"
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"
@@ -53,7 +53,7 @@ void runReplay(const ReplayArguments& arguments) {
     // Lines go out as the events happen, also when standard output is a pipe.
     replayer.run(options, [&](const HIDEvent& event) {
         const std::string line =
-            arguments.json ? eventJsonLine(event) : eventHumanLine(event, replayer.secondsSinceStart(event));
+            arguments.json ? GestureCodec::jsonLine(event) : eventHumanLine(event, replayer.secondsSinceStart(event));
         std::fputs(line.c_str(), stdout);
         std::fputc('\n', stdout);
         if (!arguments.fast) std::fflush(stdout);

@@ -1,6 +1,6 @@
 #include "tools/Replayer.h"
 
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 #include "platform/HostClock.h"
 
 namespace TolkaTouch::Tools {

@@ -10,8 +10,8 @@
 #include <CLI/CLI.hpp>
 
 #include "platform/PropertyValueJson.h"
-#include "pipeline/common/Reports.h"
-#include "pipeline/common/Util.h"
+#include "common/Reports.h"
+#include "common/Util.h"
 #include "platform/Format.h"
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"

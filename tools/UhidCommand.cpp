@@ -14,7 +14,7 @@
 #include <vector>
 
 #include "pipeline/PipelineRecording.h"
-#include "pipeline/common/ReportDescriptor.h"
+#include "common/ReportDescriptor.h"
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"
 #include "tools/VirtualSurface.h"

@@ -11,7 +11,7 @@
 #include <cstring>
 #include <stdexcept>
 
-#include "pipeline/common/ReportDescriptor.h"
+#include "common/ReportDescriptor.h"
 
 namespace TolkaTouch {
 

@@ -66,7 +66,7 @@ TEST(EventStatsTest, AcceptedTapInRegionThreeAddsOneToNumTapsAndNumVolumeUpOnly)
     hand.wasTouching = true;
     hand.tapCandidate = true;
     hand.tapDetected = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numTaps", 1}, {"numVolumeUp", 1}}));
 }
 
@@ -76,9 +76,9 @@ TEST(EventStatsTest, AcceptedTapsInRegionsOneAndTwoCountPlayPauseAndVolumeDown) 
     hand.wasTouching = true;
     hand.tapCandidate = true;
     hand.tapDetected = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.activeRegion = PixelRegion::VolumeDown;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numTaps", 2}, {"numPlayPause", 1}, {"numVolumeDown", 1}}));
 }
 
@@ -86,23 +86,23 @@ TEST(EventStatsTest, HoldInRegionOneHeldForFiveFramesCountsOneBeginFourIncrement
     EventStats stats;
     HandStats hand = handIn(PixelRegion::PlayPause);
     hand.touching = true;  // the touch starts: nothing counted
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.wasTouching = true;
     hand.touching = true;
-    stats.update(hand);  // touching, not yet holding: nothing counted
+    stats.update(hand.verdict());  // touching, not yet holding: nothing counted
     hand.holding = true;
     hand.holdTimeExceeded = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.wasHolding = true;
     hand.wasHoldTimeExceeded = true;
-    for (int i = 0; i < 4; ++i) stats.update(hand);
+    for (int i = 0; i < 4; ++i) stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats),
               (Counts{{"numBeginHold", 1}, {"numKalioCall", 1}, {"numIncrementHold", 4}, {"numKalioCallIncrement", 4}}));
 
     hand.touching = false;
     hand.holding = false;
     hand.holdTimeExceeded = false;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numBeginHold", 1},
                                             {"numKalioCall", 1},
                                             {"numIncrementHold", 4},
@@ -115,11 +115,11 @@ TEST(EventStatsTest, HoldsInRegionsTwoAndThreeCountVolumeDecrementAndIncrementEv
     HandStats hand = handIn(PixelRegion::VolumeDown);
     hand.wasTouching = hand.touching = true;
     hand.holding = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.wasHolding = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.activeRegion = PixelRegion::VolumeUp;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numBeginHold", 1},
                                             {"numIncrementHold", 2},
                                             {"numVolumeDecrement", 2},
@@ -132,7 +132,7 @@ TEST(EventStatsTest, HoldAfterASuppressedOneCountsSuppressedToHolding) {
     hand.wasTouching = hand.touching = true;
     hand.holding = true;
     hand.wasHoldSuppressed = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numSuppressed2Holding", 1}, {"numBeginHold", 1}, {"numKalioCall", 1}}));
 }
 
@@ -142,15 +142,15 @@ TEST(EventStatsTest, HoldSuppressedInTheFrameTheTimeoutPassesCountsARejectedBegi
     hand.wasTouching = hand.touching = true;
     hand.isHoldSuppressed = true;
     hand.holdTimeExceeded = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedBeginHold", 1}, {"numRejectedKalioCall", 1}}));
 
     hand.wasHoldTimeExceeded = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.activeRegion = PixelRegion::VolumeDown;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.activeRegion = PixelRegion::VolumeUp;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedBeginHold", 1},
                                             {"numRejectedKalioCall", 1},
                                             {"numRejectedIncrementHold", 3},
@@ -165,9 +165,9 @@ TEST(EventStatsTest, SuppressedWithoutTheTimeoutCountsOnlyTheVolumeButtons) {
     hand.wasTouching = hand.touching = true;
     hand.isHoldSuppressed = true;
     hand.wasHolding = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.activeRegion = PixelRegion::PlayPause;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numHolding2Suppressed", 2}, {"numRejectedVolumeDecrement", 1}}));
 }
 
@@ -177,7 +177,7 @@ TEST(EventStatsTest, SuppressedHoldThatEndsCountsARejectedEnd) {
     hand.wasTouching = true;
     hand.wasHoldTimeExceeded = true;
     hand.tapCandidate = true;  // not reached
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedEndHold", 1}}));
 }
 
@@ -186,9 +186,9 @@ TEST(EventStatsTest, RejectedTapCountsTheRejectedButton) {
     HandStats hand = handIn(PixelRegion::VolumeDown);
     hand.wasTouching = true;
     hand.tapCandidate = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     hand.activeRegion = PixelRegion::None;  // region 0: the general counter only
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedTap", 2}, {"numRejectedVolumeDown", 1}}));
 }
 
@@ -198,7 +198,7 @@ TEST(EventStatsTest, NothingIsCountedInTheFrameATouchStarts) {
     hand.touching = true;
     hand.holding = true;
     hand.tapDetected = true;
-    stats.update(hand);
+    stats.update(hand.verdict());
     EXPECT_EQ(nonZeroCounts(stats), Counts{});
 }
 

@@ -11,7 +11,7 @@
 #include <vector>
 
 #include "algs/Algs.h"
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 
 namespace TolkaTouch::Testing {
 

@@ -8,6 +8,7 @@
 
 #include "daemon/RecordingKeyOutput.h"
 #include "platform/Log.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace {
@@ -167,7 +168,7 @@ TEST_F(KeyMapperTest, RepeatDueWithoutAHeldKeyWritesNothing) {
 TEST_F(KeyMapperTest, FirmwareResetIsLoggedAndWritesNothing) {
     auto sink = std::make_shared<SystemLog::MemorySink>();
     SystemLog::setSink(sink);
-    mapper.handleEvent(*makeFirmwareResetEvent());
+    mapper.handleEvent(*GestureCodec::encode(GestureKind::Reset));
     SystemLog::setSink(nullptr);
     EXPECT_TRUE(output.writes().empty());
     EXPECT_EQ(sink->messages(), (std::vector<std::string>{"the surface's firmware reported a reset"}));

@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "pipeline/PipelineInput.h"
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 #include "platform/HostClock.h"
 
 namespace TolkaTouch::Testing {

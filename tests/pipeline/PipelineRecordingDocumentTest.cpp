@@ -9,7 +9,7 @@
 #include <typeinfo>
 #include <vector>
 
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 #include "tests/pipeline/DocumentTesting.h"
 
 namespace TolkaTouch {

@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 #include "tests/pipeline/FakePipelineInput.h"
 
 namespace TolkaTouch {

@@ -8,8 +8,9 @@
 #include <vector>
 
 #include "pipeline/PipelineRecording.h"
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 #include "tests/pipeline/FakePipelineInput.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace {
@@ -238,7 +239,7 @@ TEST_F(PipelineTest, UnknownKeysAreIgnoredOnWriteAndReadAsNullButReachTheProbes)
 TEST_F(PipelineTest, HandleHIDEventsStampsEveryEventEvenWithoutAListener) {
     pipeline.hidEventsProbe = nullptr;
     pipeline.setTime(55);
-    EventList events{makeDigitizerEvent(0, HIDEventPhase::MayBegin, 1.0), makeFirmwareResetEvent()};
+    EventList events{makeDigitizerEvent(0, HIDEventPhase::MayBegin, 1.0), GestureCodec::encode(GestureKind::Reset)};
     pipeline.handleHIDEvents(events);
     EXPECT_EQ(events[0]->timestamp, 55u);
     EXPECT_EQ(events[1]->timestamp, 55u);

@@ -57,7 +57,7 @@ TEST(HIDEventTest, OtherIntegerFieldsReadAsZeroAndIgnoreWrites) {
 }
 
 TEST(HIDEventTest, FirmwareResetEventIsVendorDefinedOnUsagePage0xFF60Usage2) {
-    const HIDEventRef event = makeFirmwareResetEvent();
+    const HIDEventRef event = makeVendorDefinedEvent(0xFF60, 2);
     ASSERT_NE(event, nullptr);
     EXPECT_EQ(event->type, HIDEventType::VendorDefined);
     EXPECT_EQ(static_cast<uint32_t>(event->type), 1u);
@@ -88,7 +88,7 @@ TEST(HIDEventTest, TapDescriptionShowsItsMaskInHex) {
 }
 
 TEST(HIDEventTest, FirmwareResetDescriptionNamesItsUsage) {
-    const HIDEventRef event = makeFirmwareResetEvent();
+    const HIDEventRef event = makeVendorDefinedEvent(0xFF60, 2);
     event->timestamp = 77;
     EXPECT_EQ(event->description(), "VendorDefined timestamp=77 usagePage=0xFF60 usage=2 version=0 length=0 options=0");
 }
@@ -98,7 +98,7 @@ TEST(HIDEventTest, EventListKeepsItsEventsAliveAndInOrder) {
     {
         EventList events;
         events.push_back(makeDigitizerEvent(0, HIDEventPhase::MayBegin, 1.0));
-        events.push_back(makeFirmwareResetEvent());
+        events.push_back(makeVendorDefinedEvent(0xFF60, 2));
         watched = events.front();
         EXPECT_EQ(events[0]->type, HIDEventType::Digitizer);
         EXPECT_EQ(events[1]->type, HIDEventType::VendorDefined);

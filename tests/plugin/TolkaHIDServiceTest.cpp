@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include "plugin/TolkaIUnknown.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace {
@@ -69,12 +70,12 @@ TEST_F(PlainServiceTest, FreshObjectHoldsOneReference) {
 
 TEST_F(PlainServiceTest, ProbeStartStopAndOutputEventsAreNotSupported) {
     int32_t score = 17;
-    EXPECT_EQ(plugin->Probe(pluginHandle, nullptr, 5, &score), Host::kResultUnsupported);
+    EXPECT_EQ(plugin->Probe(pluginHandle, nullptr, 5, &score), HIDResult::Unsupported);
     EXPECT_EQ(score, 17);
-    EXPECT_EQ(plugin->Start(pluginHandle, nullptr, 5), Host::kResultUnsupported);
-    EXPECT_EQ(plugin->Stop(pluginHandle), Host::kResultUnsupported);
-    HIDEventRef event = makeFirmwareResetEvent();
-    EXPECT_EQ(service->setOutputEvent(serviceHandle, &event), Host::kResultUnsupported);
+    EXPECT_EQ(plugin->Start(pluginHandle, nullptr, 5), HIDResult::Unsupported);
+    EXPECT_EQ(plugin->Stop(pluginHandle), HIDResult::Unsupported);
+    HIDEventRef event = GestureCodec::encode(GestureKind::Reset);
+    EXPECT_EQ(service->setOutputEvent(serviceHandle, &event), HIDResult::Unsupported);
 }
 
 TEST_F(PlainServiceTest, OpenAnswersFalseAndPropertiesAndEventsAnswerNothing) {

@@ -8,6 +8,7 @@
 
 #include "plugin/TolkaHIDService.h"
 #include "tests/plugin/PlugInHost.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace {
@@ -109,7 +110,7 @@ TEST_F(TolkaIUnknownTest, ReleaseOfTheLastReferenceReturnsOneAndDeletesTheObject
 
 TEST_F(TolkaIUnknownTest, QueryInterfaceAnswersTheBaseInterfaceWithThePlugInHandle) {
     void* answer = nullptr;
-    EXPECT_EQ(TolkaIUnknown::QueryInterface(service, Host::kIUnknownInterfaceID, &answer), Host::kResultSuccess);
+    EXPECT_EQ(TolkaIUnknown::QueryInterface(service, Host::kIUnknownInterfaceID, &answer), HIDResult::Success);
     EXPECT_EQ(answer, plugin);
     EXPECT_EQ(object->retainCount(), 2u);
     object->release();
@@ -117,7 +118,7 @@ TEST_F(TolkaIUnknownTest, QueryInterfaceAnswersTheBaseInterfaceWithThePlugInHand
 
 TEST_F(TolkaIUnknownTest, QueryInterfaceAnswersTheServiceInterfaceWithTheServiceHandle) {
     void* answer = nullptr;
-    EXPECT_EQ(TolkaIUnknown::QueryInterface(plugin, Host::kHIDServiceInterfaceID, &answer), Host::kResultSuccess);
+    EXPECT_EQ(TolkaIUnknown::QueryInterface(plugin, Host::kHIDServiceInterfaceID, &answer), HIDResult::Success);
     EXPECT_EQ(answer, service);
     EXPECT_EQ(object->retainCount(), 2u);
     object->release();
@@ -126,7 +127,7 @@ TEST_F(TolkaIUnknownTest, QueryInterfaceAnswersTheServiceInterfaceWithTheService
 TEST_F(TolkaIUnknownTest, QueryInterfaceWithThePlugInTypeLeavesTheAnswerAndTheCountAlone) {
     void* answer = this;
     EXPECT_EQ(TolkaIUnknown::QueryInterface(plugin, Host::kHIDServicePlugInTypeID, &answer),
-              Host::kResultNoInterface);
+              HIDResult::NoInterface);
     EXPECT_EQ(answer, static_cast<void*>(this));
     EXPECT_EQ(object->retainCount(), 1u);
 }
@@ -197,7 +198,7 @@ TEST_F(TolkaIUnknownTest, SchedulingForwardsTheHostsQueue) {
 }
 
 TEST_F(TolkaIUnknownTest, CopyEventAndSetOutputEventForwardTheirArguments) {
-    HIDEventRef event = makeFirmwareResetEvent();
+    HIDEventRef event = GestureCodec::encode(GestureKind::Reset);
     EXPECT_EQ(TolkaIUnknown::copyEvent(service, 11, &event, 3), event);
     EXPECT_EQ(object->eventType, 11u);
     EXPECT_EQ(object->options, 3u);
@@ -209,7 +210,7 @@ TEST_F(TolkaIUnknownTest, AnExceptionInsideAMethodIsLoggedAndNeverReachesTheHost
     Testing::SinkInstallation sinks;
     object->throwing = true;
     int32_t score = 0;
-    EXPECT_EQ(TolkaIUnknown::Probe(plugin, nullptr, 1, &score), Host::kResultUnsupported);
+    EXPECT_EQ(TolkaIUnknown::Probe(plugin, nullptr, 1, &score), HIDResult::Unsupported);
     EXPECT_TRUE(TolkaIUnknown::copyProperty(service, "Recording").isNull());
     EXPECT_EQ(sinks.log->messages(), (std::vector<std::string>{
                                          "probeWithService:properties:outScore: failed: probe broke",

@@ -9,6 +9,7 @@
 
 #include "pipeline/PipelineRecording.h"
 #include "tests/plugin/PlugInHost.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace {
@@ -197,13 +198,13 @@ TEST_F(TolkaTouchHIDServiceDispatchTest, EventsCarryTheRecordingsClockReadingOfT
 
 TEST_F(TolkaTouchHIDServiceDispatchTest, SetOutputEventAnswersUnsupportedForAnyEvent) {
     HIDEventRef event = makeDigitizerEvent(0, HIDEventPhase::Began, 1);
-    EXPECT_EQ((*host.service)->setOutputEvent(host.service, &event), Host::kResultUnsupported);
-    EXPECT_EQ((*host.service)->setOutputEvent(host.service, nullptr), Host::kResultUnsupported);
+    EXPECT_EQ((*host.service)->setOutputEvent(host.service, &event), HIDResult::Unsupported);
+    EXPECT_EQ((*host.service)->setOutputEvent(host.service, nullptr), HIDResult::Unsupported);
     EXPECT_EQ(sinks.log->messages(), (std::vector<std::string>{"setOutputEvent:", "setOutputEvent:"}));
 }
 
 TEST_F(TolkaTouchHIDServiceDispatchTest, CopyEventAnswersNullForAnyArguments) {
-    HIDEventRef event = makeFirmwareResetEvent();
+    HIDEventRef event = GestureCodec::encode(GestureKind::Reset);
     EXPECT_EQ((*host.service)->copyEvent(host.service, 11, &event, 1), nullptr);
     EXPECT_EQ((*host.service)->copyEvent(host.service, 0, nullptr, 0), nullptr);
     EXPECT_EQ(sinks.log->messages(), (std::vector<std::string>{"copyEventWithType:matching:options:",

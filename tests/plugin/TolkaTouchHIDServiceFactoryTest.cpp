@@ -67,7 +67,7 @@ TEST(TolkaTouchHIDServiceFactoryTest, QueryInterfaceWithIUnknownReturnsTheFactor
     auto plugin = static_cast<Host::PlugInInterface**>(plugInFactory()(nullptr, Host::kHIDServicePlugInTypeID));
     ASSERT_NE(plugin, nullptr);
     void* answer = nullptr;
-    EXPECT_EQ((*plugin)->QueryInterface(plugin, Host::kIUnknownInterfaceID, &answer), Host::kResultSuccess);
+    EXPECT_EQ((*plugin)->QueryInterface(plugin, Host::kIUnknownInterfaceID, &answer), HIDResult::Success);
     EXPECT_EQ(answer, static_cast<void*>(plugin));
     EXPECT_EQ(referencesOf(plugin), 2u);
     (*plugin)->Release(plugin);
@@ -79,7 +79,7 @@ TEST(TolkaTouchHIDServiceFactoryTest, QueryInterfaceWithServiceIdentifierReturns
     ASSERT_NE(plugin, nullptr);
     Host::HIDServiceInterface** service = nullptr;
     EXPECT_EQ((*plugin)->QueryInterface(plugin, Host::kHIDServiceInterfaceID, reinterpret_cast<void**>(&service)),
-              Host::kResultSuccess);
+              HIDResult::Success);
     ASSERT_NE(service, nullptr);
     EXPECT_NE(static_cast<void*>(service), static_cast<void*>(plugin));
     EXPECT_EQ((*service)->_reserved, (*plugin)->_reserved);
@@ -87,7 +87,7 @@ TEST(TolkaTouchHIDServiceFactoryTest, QueryInterfaceWithServiceIdentifierReturns
 
     // The service table answers the same questions with the same handles.
     void* again = nullptr;
-    EXPECT_EQ((*service)->QueryInterface(service, Host::kIUnknownInterfaceID, &again), Host::kResultSuccess);
+    EXPECT_EQ((*service)->QueryInterface(service, Host::kIUnknownInterfaceID, &again), HIDResult::Success);
     EXPECT_EQ(again, static_cast<void*>(plugin));
     EXPECT_EQ(referencesOf(plugin), 3u);
     (*service)->Release(service);
@@ -100,8 +100,8 @@ TEST(TolkaTouchHIDServiceFactoryTest, QueryInterfaceWithThePlugInTypeOrAnyOtherI
     ASSERT_NE(plugin, nullptr);
     int untouched = 0;
     void* answer = &untouched;
-    EXPECT_EQ((*plugin)->QueryInterface(plugin, Host::kHIDServicePlugInTypeID, &answer), Host::kResultNoInterface);
-    EXPECT_EQ((*plugin)->QueryInterface(plugin, kOtherID, &answer), Host::kResultNoInterface);
+    EXPECT_EQ((*plugin)->QueryInterface(plugin, Host::kHIDServicePlugInTypeID, &answer), HIDResult::NoInterface);
+    EXPECT_EQ((*plugin)->QueryInterface(plugin, kOtherID, &answer), HIDResult::NoInterface);
     EXPECT_EQ(answer, static_cast<void*>(&untouched));
     EXPECT_EQ(referencesOf(plugin), 1u);
     (*plugin)->Release(plugin);

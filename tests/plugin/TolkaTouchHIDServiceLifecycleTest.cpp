@@ -51,14 +51,14 @@ TEST(TolkaTouchHIDServiceLifecycleTest, ProbeAnswersZeroAndNeverChangesTheScore)
     PlugInHost host;
     int32_t score = 300;
     PropertyValue matching(PropertyValue::Dictionary{{"PrimaryUsagePage", PropertyValue(0xFF60)}});
-    EXPECT_EQ((*host.plugin)->Probe(host.plugin, &matching, host.serviceHandle, &score), Host::kResultSuccess);
+    EXPECT_EQ((*host.plugin)->Probe(host.plugin, &matching, host.serviceHandle, &score), HIDResult::Success);
     EXPECT_EQ(score, 300);
 }
 
 TEST(TolkaTouchHIDServiceLifecycleTest, StartCreatesTheDeviceWithoutOpeningIt) {
     PlugInHost host;
     const long before = host.device.use_count();
-    EXPECT_EQ(host.start(), Host::kResultSuccess);
+    EXPECT_EQ(host.start(), HIDResult::Success);
     EXPECT_EQ(host.device.use_count(), before + 1);
     EXPECT_EQ(host.device->counts().open, 0);
 }
@@ -66,7 +66,7 @@ TEST(TolkaTouchHIDServiceLifecycleTest, StartCreatesTheDeviceWithoutOpeningIt) {
 TEST(TolkaTouchHIDServiceLifecycleTest, StartWithoutADeviceForTheServiceAnswersNotCreated) {
     PlugInHost host;
     HIDServiceRegistry::unregisterService(host.serviceHandle);
-    EXPECT_EQ(host.start(), Host::kResultNotCreated);
+    EXPECT_EQ(host.start(), HIDResult::NotCreated);
     EXPECT_FALSE(host.open());
 }
 
@@ -98,9 +98,9 @@ TEST(TolkaTouchHIDServiceLifecycleTest, StopReleasesTheDeviceHandle) {
     PlugInHost host;
     const long before = host.device.use_count();
     host.start();
-    EXPECT_EQ(host.stop(), Host::kResultSuccess);
+    EXPECT_EQ(host.stop(), HIDResult::Success);
     EXPECT_EQ(host.device.use_count(), before);
-    EXPECT_EQ(host.stop(), Host::kResultSuccess);  // nothing left to release
+    EXPECT_EQ(host.stop(), HIDResult::Success);  // nothing left to release
 }
 
 TEST(TolkaTouchHIDServiceLifecycleTest, LifecycleOperationsLogTheirNamesAtDebugLevel) {
@@ -298,7 +298,7 @@ TEST(TolkaTouchHIDServiceLifecycleTest, ThreadListensWithA512ByteBufferInItsPriv
     auto device = std::make_shared<Testing::CallLogDevice>();
     Testing::ServedDevice served(device);
     PlugInHost host;
-    ASSERT_EQ((*host.plugin)->Start(host.plugin, nullptr, served.serviceHandle), Host::kResultSuccess);
+    ASSERT_EQ((*host.plugin)->Start(host.plugin, nullptr, served.serviceHandle), HIDResult::Success);
     host.open();
     host.setEventCallback();
     host.schedule();

@@ -207,7 +207,7 @@ struct TolkaTouchHIDServiceDeviceCallsTest : ::testing::Test {
     Testing::ServedDevice served{device};
     PlugInHost host;
     void SetUp() override {
-        ASSERT_EQ((*host.plugin)->Start(host.plugin, nullptr, served.serviceHandle), Host::kResultSuccess);
+        ASSERT_EQ((*host.plugin)->Start(host.plugin, nullptr, served.serviceHandle), HIDResult::Success);
     }
 };
 

@@ -6,6 +6,7 @@
 
 #include "platform/HIDServiceRegistry.h"
 #include "tests/plugin/PlugInHost.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace {
@@ -121,7 +122,7 @@ TEST_F(TolkaTouchHIDServiceTest, ReportThatYieldsThreeEventsTracesThemAndCallsBa
     run();
     ASSERT_TRUE(eventually([&] { return service->probesInstalled(); }));
     const EventList events = {makeDigitizerEvent(1, HIDEventPhase::MayBegin, 1),
-                              makeDigitizerEvent(2, HIDEventPhase::Began, 1), makeFirmwareResetEvent()};
+                              makeDigitizerEvent(2, HIDEventPhase::Began, 1), GestureCodec::encode(GestureKind::Reset)};
     // Handed to the installed probe on the input report thread, as the pipeline does.
     service->_inputReportRunLoop->performBlock(TolkaTouchHIDService::kInputReportRunLoopMode, [&] {
         std::lock_guard lock(service->_pipelineLock);

@@ -1,4 +1,5 @@
 #include "tools/EventPrinter.h"
+#include "tolkatouch/Gesture.h"
 
 #include <gtest/gtest.h>
 
@@ -13,7 +14,7 @@ HIDEventRef digitizer(uint32_t mask, uint32_t phase, double y, int64_t frame) {
 }
 
 TEST(EventPrinterTest, ResetEventHasNoFrame) {
-    HIDEventRef reset = makeFirmwareResetEvent();
+    HIDEventRef reset = GestureCodec::encode(GestureKind::Reset);
     EXPECT_EQ(eventHumanLine(*reset, 5.0), "  5.000s  frame -     reset");
 }
 

@@ -2,7 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include "platform/HIDEventJson.h"
+#include "tolkatouch/Gesture.h"
 #include "tools/EventPrinter.h"
 #include "tools/GestureScript.h"
 #include "tools/Synthesizer.h"
@@ -35,7 +35,7 @@ TEST(ReplayerTest, SettingsApplyBeforeTheFirstFrame) {
     ReplayOptions options;
     options.fast = true;
     options.settings = {{"Algs.ActivationThreshold", PropertyValue(5000.0)}};
-    replayer.run(options, [&](const HIDEvent& event) { kinds.emplace_back(eventKindName(event)); });
+    replayer.run(options, [&](const HIDEvent& event) { kinds.emplace_back(GestureCodec::kindName(event)); });
     EXPECT_TRUE(kinds.empty());
     EXPECT_EQ(replayer.pipeline().getState("Algs.ActivationThreshold"), PropertyValue(5000.0f));
 }

@@ -11,8 +11,8 @@
 #include <string>
 #include <vector>
 
-#include "pipeline/common/Reports.h"
-#include "platform/HIDEventJson.h"
+#include "common/Reports.h"
+#include "tolkatouch/Gesture.h"
 #include "tools/GestureScript.h"
 #include "tools/Replayer.h"
 #include "tools/Synthesizer.h"
@@ -47,7 +47,7 @@ std::vector<SeenEvent> replayedEvents(const Synthesis& synthesis) {
     ReplayOptions options;
     options.fast = true;
     replayer.run(options, [&](const HIDEvent& event) {
-        events.push_back(SeenEvent{std::string(eventKindName(event)), static_cast<int>(event.y), event.timestamp});
+        events.push_back(SeenEvent{std::string(GestureCodec::kindName(event)), static_cast<int>(event.y), event.timestamp});
     });
     return events;
 }

@@ -14,7 +14,7 @@
 #include <string>
 #include <vector>
 
-#include "pipeline/common/ReportDescriptor.h"
+#include "common/ReportDescriptor.h"
 
 namespace TolkaTouch {
 namespace {

@@ -50,7 +50,7 @@
 #include "pipeline/Pipeline.h"
 #include "pipeline/PipelineRecording.h"
 #include "platform/PropertyValueJson.h"
-#include "pipeline/common/ReportDescriptor.h"
+#include "common/ReportDescriptor.h"
 #include "tools/VirtualSurface.h"
 
 namespace TolkaTouch {

@@ -1,4 +1,4 @@
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 
 #include <gtest/gtest.h>
 

@@ -1,6 +1,6 @@
 // Time conversion with a host clock whose timebase is 125/3 (a tick is 41.67 ns). The timebase is
 // read once per process, so it is installed before any conversion runs.
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 #include <gtest/gtest.h>
 

@@ -1,24 +1,16 @@
 #pragma once
 // The surface's report formats: the image input report, the firmware event input report and the
 // factory-reset hold duration feature report, with parsers that return nothing for a short or
-// foreign report. Also PixelRegion, the zone of the surface a touch is in.
+// foreign report.
 
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <optional>
 
+#include "tolkatouch/PixelRegion.h"
+
 namespace TolkaTouch {
-
-// The zone of the surface where a touch is active; carried as a 32-bit unsigned number.
-enum class PixelRegion : uint32_t {
-    None = 0,
-    PlayPause = 1,   // pixels A-F and K
-    VolumeDown = 2,  // pixels L-O
-    VolumeUp = 3,    // pixels G-J
-};
-
-inline constexpr size_t kPixelCount = 15;
 
 namespace InputReport {
 

@@ -1,4 +1,4 @@
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 #include <cinttypes>
 #include <cstdio>

@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 #include "platform/Format.h"
 
 namespace TolkaTouch::Util {

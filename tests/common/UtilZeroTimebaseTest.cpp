@@ -1,6 +1,6 @@
 // Time conversion with a host clock that reports a 0/0 timebase: each conversion, dividing by
 // zero, gives 0 instead of failing.
-#include "pipeline/common/Util.h"
+#include "common/Util.h"
 
 #include <gtest/gtest.h>
 

@@ -1,4 +1,4 @@
-#include "pipeline/common/ReportDescriptor.h"
+#include "common/ReportDescriptor.h"
 
 #include <gtest/gtest.h>
 
@@ -9,7 +9,7 @@
 #include <utility>
 #include <vector>
 
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
 
 namespace TolkaTouch {
 namespace {

@@ -9,7 +9,8 @@
 #include <cstddef>
 #include <cstdint>
 
-#include "pipeline/common/Reports.h"
+#include "common/Reports.h"
+#include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch {
 namespace ReportDescriptor {
@@ -24,7 +25,8 @@ struct ReportInfo {
     uint8_t payloadLength;
 };
 
-inline constexpr uint16_t kVendorUsagePage = 0xFF60;
+// The surface speaks on the same vendor page on which its reset reaches the host as an event.
+inline constexpr uint16_t kVendorUsagePage = GestureCodec::kVendorUsagePage;
 inline constexpr uint8_t kApplicationUsage = 0x01;
 
 // The firmware's diagnostic blocks, in the order the service dumps them; their contents are the
