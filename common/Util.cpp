@@ -8,7 +8,9 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "platform/Format.h"
+#include <fmt/format.h>
+
+#include "platform/Hex.h"
 #include "platform/HostClock.h"
 
 namespace TolkaTouch::Util {
@@ -42,6 +44,11 @@ uint64_t machTimeFromNanoseconds(uint64_t nanoseconds) {
 uint64_t nanosecondsFromMachTime(uint64_t ticks) {
     const Timebase& base = timebase();
     return scale(ticks, base.numerator, base.denominator);
+}
+
+std::string hexStringFromBytes(const std::vector<uint8_t>& bytes) {
+    // The trailing space is part of the format: readers split the text at whitespace.
+    return Hex::text(bytes, Hex::Spacing::AfterEach);
 }
 
 std::vector<uint8_t> bytesFromHexString(const std::string* text) {
@@ -84,9 +91,9 @@ namespace {
 // width. A reading wider than the run still gets (its excess) spaces after it, because a negative
 // field width pads on the left-aligned side; the layout of diagnostics depends on this.
 void appendPixelField(std::string& body, intmax_t value, int runLength) {
-    const std::string number = formatString("%*jd", runLength / 2, value);
+    const std::string number = fmt::format("{:>{}}", value, runLength / 2);
     body += number;
-    body += formatString("%*s", runLength - static_cast<int>(number.size()), "");
+    body.append(static_cast<size_t>(std::abs(runLength - static_cast<int>(number.size()))), ' ');
 }
 
 }  // namespace
@@ -117,7 +124,7 @@ std::string stringFromImage(const InputReport::Image& image, bool useRawPixels) 
         }
         body += '\n';
     }
-    return formatString("# Image frame %u    time %u ms\n\n%s", image.frameNumber, image.timeMs, body.c_str());
+    return fmt::format("# Image frame {}    time {} ms\n\n{}", image.frameNumber, image.timeMs, body);
 }
 
 }  // namespace TolkaTouch::Util

@@ -18,8 +18,8 @@ namespace TolkaTouch::Util {
 uint64_t machTimeFromNanoseconds(uint64_t nanoseconds);
 uint64_t nanosecondsFromMachTime(uint64_t ticks);
 
-// "%02x " per byte: "0a ff 00 " for {0x0a, 0xff, 0x00}; "" for no bytes (platform/Format.h).
-using TolkaTouch::hexStringFromBytes;
+// "%02x " per byte: "0a ff 00 " for {0x0a, 0xff, 0x00}; "" for no bytes.
+std::string hexStringFromBytes(const std::vector<uint8_t>& bytes);
 
 // Whitespace-separated hex tokens up to the first one that does not read; throws
 // std::invalid_argument("invalid hex string") for a token of 256 or more. A null pointer reads

@@ -1,18 +1,16 @@
 #include "daemon/KeyOutput.h"
 
+#include <libevdev/libevdev.h>
 #include <linux/input-event-codes.h>
 
 namespace TolkaTouch {
 
 namespace {
+// The input subsystem's own name of a key, as libevdev knows it; a number it does not name is
+// written after "KEY_".
 std::string keyName(uint16_t code) {
-    switch (code) {
-    case KEY_PLAYPAUSE: return "KEY_PLAYPAUSE";
-    case KEY_VOLUMEUP: return "KEY_VOLUMEUP";
-    case KEY_VOLUMEDOWN: return "KEY_VOLUMEDOWN";
-    case KEY_VOICECOMMAND: return "KEY_VOICECOMMAND";
-    default: return "KEY_" + std::to_string(code);
-    }
+    const char* name = libevdev_event_code_get_name(EV_KEY, code);
+    return name ? std::string(name) : "KEY_" + std::to_string(code);
 }
 }  // namespace
 

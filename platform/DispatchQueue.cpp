@@ -7,7 +7,7 @@
 #include <mutex>
 #include <thread>
 
-#include "platform/Semaphore.h"
+#include <semaphore>
 
 namespace TolkaTouch {
 
@@ -77,14 +77,14 @@ bool DispatchQueue::sync(Task task) {
     if (isCurrent()) {
         return false;
     }
-    Semaphore done;
+    std::counting_semaphore<> done{0};
     async([&task, &done] {
         if (task) {
             task();
         }
-        done.signal();
+        done.release();
     });
-    done.wait();
+    done.acquire();
     return true;
 }
 

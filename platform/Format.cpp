@@ -25,17 +25,4 @@ std::string formatString(const char* format, ...) {
     return text;
 }
 
-std::string hexStringFromBytes(const std::vector<uint8_t>& bytes) {
-    static constexpr char kDigits[] = "0123456789abcdef";
-    std::string text;
-    text.reserve(bytes.size() * 3);
-    for (uint8_t byte : bytes) {
-        // The trailing space is part of the format: readers split the text at whitespace.
-        text += kDigits[byte >> 4];
-        text += kDigits[byte & 0xF];
-        text += ' ';
-    }
-    return text;
-}
-
 }  // namespace TolkaTouch

@@ -1,5 +1,7 @@
 #include "platform/PropertyValue.h"
 
+#include "platform/Hex.h"
+
 #include <cmath>
 #include <cstdio>
 #include <limits>
@@ -159,10 +161,7 @@ static void describe(const PropertyValue& value, std::string& out) {
     case PropertyValue::Kind::String: appendQuoted(out, *value.string()); break;
     case PropertyValue::Kind::Data:
         out += '<';
-        for (size_t i = 0; i < value.data()->size(); ++i) {
-            std::snprintf(buf, sizeof buf, "%s%02x", i ? " " : "", (*value.data())[i]);
-            out += buf;
-        }
+        out += Hex::text(*value.data(), Hex::Spacing::Between);
         out += '>';
         break;
     case PropertyValue::Kind::Array: {

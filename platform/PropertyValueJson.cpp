@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "platform/Format.h"
+#include "platform/Hex.h"
 
 namespace TolkaTouch::PropertyValueJson {
 
@@ -109,7 +110,7 @@ nlohmann::ordered_json toJson(const PropertyValue& value, size_t maxDepth) {
         return number;
     }
     case PropertyValue::Kind::String: return *value.string();
-    case PropertyValue::Kind::Data: return hexStringFromBytes(*value.data());
+    case PropertyValue::Kind::Data: return Hex::text(*value.data(), Hex::Spacing::AfterEach);
     case PropertyValue::Kind::Array: {
         nlohmann::ordered_json array = nlohmann::ordered_json::array();
         for (const PropertyValue& element : *value.array()) array.push_back(toJson(element, maxDepth - 1));

@@ -63,24 +63,24 @@ void TolkaTouchHIDService::scheduleWithDispatchQueue(const DispatchQueueRef& que
     _dispatchEventInfo.queue = queue;
     _dispatchEventInfo.sender = getServiceInterface();
     DispatchEventInfo dispatchEventInfo = _dispatchEventInfo;
-    _inputReportThreadSignal = std::make_shared<Semaphore>(0);
+    _inputReportThreadSignal = std::make_shared<std::counting_semaphore<>>(0);
     std::thread(inputReportThread, this, std::move(dispatchEventInfo)).detach();
     // Returns once the thread has published its run loop, so that unschedule can always reach it.
-    _inputReportThreadSignal->wait();
+    _inputReportThreadSignal->acquire();
 }
 
 void TolkaTouchHIDService::inputReportThread(TolkaTouchHIDService* service, DispatchEventInfo dispatchEventInfo) {
     // The thread's own references: once it has signalled the end, unschedule returns and the host
     // may release the service at once, so nothing of the service is touched after that signal.
-    std::shared_ptr<Semaphore> signal = service->_inputReportThreadSignal;
+    std::shared_ptr<std::counting_semaphore<>> signal = service->_inputReportThreadSignal;
     Log log = service->_log;
 
     log.debug("%s", "input report thread start");
     service->_inputReportRunLoop = RunLoop::current();
-    signal->signal();
+    signal->release();
     service->handleInputReports(&dispatchEventInfo);
     dispatchEventInfo = {};
-    signal->signal();
+    signal->release();
     log.debug("%s", "input report thread end");
 }
 
@@ -140,7 +140,7 @@ void TolkaTouchHIDService::unscheduleWithDispatchQueue(const DispatchQueueRef&) 
         _inputReportRunLoop->wakeUp();
         _inputReportRunLoop.reset();
         _log.debug("%s", "waiting for input report thread to exit");
-        _inputReportThreadSignal->wait();
+        _inputReportThreadSignal->acquire();
         _inputReportThreadSignal.reset();
         _log.debug("%s", "input report thread exited");
     }

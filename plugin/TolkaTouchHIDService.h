@@ -24,7 +24,7 @@
 #include "platform/Log.h"
 #include "platform/PropertyValue.h"
 #include "platform/RunLoop.h"
-#include "platform/Semaphore.h"
+#include <semaphore>
 #include "plugin/TolkaHIDService.h"
 
 namespace TolkaTouch {
@@ -103,7 +103,7 @@ protected:
     Log _log;
     HIDDeviceRef _tolkaDevice;
     std::shared_ptr<RunLoop> _inputReportRunLoop;
-    std::shared_ptr<Semaphore> _inputReportThreadSignal;
+    std::shared_ptr<std::counting_semaphore<>> _inputReportThreadSignal;
     DispatchEventInfo _dispatchEventInfo;
     std::mutex _pipelineLock;
     std::shared_ptr<Pipeline> _pipeline;

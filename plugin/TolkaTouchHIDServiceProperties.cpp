@@ -3,9 +3,10 @@
 #include <array>
 #include <string>
 
+#include <fmt/format.h>
+
 #include "common/Reports.h"
 #include "common/Util.h"
-#include "platform/Format.h"
 #include "plugin/TolkaTouchHIDService.h"
 
 namespace TolkaTouch {
@@ -70,10 +71,9 @@ PropertyValue TolkaTouchHIDService::firmwareDebugReports() {
         size_t length = buffer.size();
         uint32_t result = _tolkaDevice ? _tolkaDevice->getReport(HIDReportType::Feature, reportID, buffer.data(), length)
                                        : HIDResult::NotCreated;
-        std::string name = formatString("0x%02jx", static_cast<uintmax_t>(reportID));
+        std::string name = fmt::format("0x{:02x}", reportID);
         if (result != HIDResult::Success) {
-            reports[name] = formatString("Failed to get report ID 0x%jx: 0x%jx", static_cast<uintmax_t>(reportID),
-                                         static_cast<uintmax_t>(result));
+            reports[name] = fmt::format("Failed to get report ID 0x{:x}: 0x{:x}", reportID, result);
         } else {
             reports[name] = Util::hexStringFromBytes(std::vector<uint8_t>(buffer.begin(), buffer.begin() + length));
         }
@@ -107,8 +107,8 @@ PropertyValue TolkaTouchHIDService::servicePluginDebug() {
         "Version",
         "FirmwareDebugReports",
         "Recording",
-        formatString("%s.%s", kPipelineDomain, kDebugInfoKey),
-        formatString("%s.%s.%s", kPipelineDomain, kAlgsDomain, kDebugInfoKey),
+        fmt::format("{}.{}", kPipelineDomain, kDebugInfoKey),
+        fmt::format("{}.{}.{}", kPipelineDomain, kAlgsDomain, kDebugInfoKey),
     };
     PropertyValue::Dictionary debug;
     for (const std::string& key : keys) {

@@ -2,7 +2,8 @@
 
 #include <cstdint>
 
-#include "platform/Format.h"
+#include <fmt/format.h>
+
 #include "tolkatouch/Gesture.h"
 
 namespace TolkaTouch::Tools {
@@ -23,12 +24,12 @@ std::string_view eventButtonName(const HIDEvent& event) {
 std::string eventHumanLine(const HIDEvent& event, double secondsSinceStart) {
     const std::string kind(GestureCodec::kindName(event));
     if (event.type != HIDEventType::Digitizer) {
-        return formatString("%7.3fs  frame %-4s  %s", secondsSinceStart, "-", kind.c_str());
+        return fmt::format("{:7.3f}s  frame {:<4}  {}", secondsSinceStart, "-", kind);
     }
     const std::string button(eventButtonName(event));
-    std::string line = formatString("%7.3fs  frame %-4lld  %-11s region %lld", secondsSinceStart,
-                                    static_cast<long long>(event.integerValue(kDigitizerFrameNumberField)),
-                                    kind.c_str(), static_cast<long long>(event.y));
+    std::string line = fmt::format("{:7.3f}s  frame {:<4}  {:<11} region {}", secondsSinceStart,
+                                   event.integerValue(kDigitizerFrameNumberField), kind,
+                                   static_cast<long long>(event.y));
     if (!button.empty()) line += "  " + button;
     return line;
 }

@@ -5,10 +5,11 @@
 #include <utility>
 #include <vector>
 
+#include <fmt/format.h>
 #include <nlohmann/json.hpp>
 
 #include "platform/PropertyValueJson.h"
-#include "platform/Format.h"
+
 
 namespace TolkaTouch::Tools {
 
@@ -47,8 +48,7 @@ std::string statsTable(const Pipeline& pipeline) {
     }
     std::string table;
     for (const auto& [name, count] : rows) {
-        table += formatString("%-*s  %*llu\n", static_cast<int>(nameWidth), name.c_str(), static_cast<int>(numberWidth),
-                              static_cast<unsigned long long>(count));
+        table += fmt::format("{:<{}}  {:>{}}\n", name, nameWidth, count, numberWidth);
     }
     return table;
 }

@@ -1,5 +1,7 @@
 #include "tools/VirtualSurface.h"
 
+#include "platform/Hex.h"
+
 #include <fcntl.h>
 #include <linux/input.h>
 #include <poll.h>
@@ -78,16 +80,12 @@ std::pair<uint8_t, std::vector<uint8_t>> VirtualSurface::featureFromOption(const
     auto equals = option.find('=');
     if (equals == std::string::npos) throw std::invalid_argument("expected ID=HEX, got " + option);
     uint8_t id = reportIDFromText(option.substr(0, equals));
-    std::string digits;
-    for (char c : option.substr(equals + 1)) {
-        if (c == ' ' || c == ':') continue;
-        if (!std::isxdigit(static_cast<unsigned char>(c))) throw std::invalid_argument("not hex: " + option);
-        digits += c;
-    }
-    if (digits.size() % 2 != 0) throw std::invalid_argument("odd number of hex digits: " + option);
     std::vector<uint8_t> bytes{id};
-    for (size_t i = 0; i < digits.size(); i += 2) {
-        bytes.push_back(static_cast<uint8_t>(std::stoul(digits.substr(i, 2), nullptr, 16)));
+    try {
+        const std::vector<uint8_t> payload = Hex::bytesFromPairs(std::string_view(option).substr(equals + 1), " :");
+        bytes.insert(bytes.end(), payload.begin(), payload.end());
+    } catch (const std::invalid_argument& error) {
+        throw std::invalid_argument(std::string(error.what()) + ": " + option);
     }
     if (bytes.size() > 128) throw std::invalid_argument("longer than 127 bytes after the ID: " + option);
     return {id, bytes};

@@ -13,8 +13,12 @@ TEST(KeyOutputTest, WriteIsDescribedByKeyNameAndValue) {
     EXPECT_EQ(describeKeyWrite({KEY_VOICECOMMAND, 0}), "KEY_VOICECOMMAND 0");
 }
 
-TEST(KeyOutputTest, OtherKeyIsDescribedByItsCode) {
-    EXPECT_EQ(describeKeyWrite({30, 1}), "KEY_30 1");
+TEST(KeyOutputTest, AnyKeyIsDescribedByTheInputSubsystemsName) {
+    EXPECT_EQ(describeKeyWrite({30, 1}), "KEY_A 1");
+}
+
+TEST(KeyOutputTest, ACodeWithoutANameIsDescribedByItsNumber) {
+    EXPECT_EQ(describeKeyWrite({0x2fe, 0}), "KEY_766 0");
 }
 
 }  // namespace

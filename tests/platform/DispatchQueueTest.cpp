@@ -6,7 +6,7 @@
 #include <thread>
 #include <vector>
 
-#include "platform/Semaphore.h"
+#include <semaphore>
 
 namespace TolkaTouch {
 namespace {
@@ -20,12 +20,12 @@ TEST(DispatchQueueTest, KeepsItsLabel) {
 TEST(DispatchQueueTest, TasksRunInSubmissionOrder) {
     auto queue = DispatchQueue::create("order");
     std::vector<int> order;  // touched only by the queue's tasks until `done`
-    Semaphore done;
+    std::counting_semaphore<> done{0};
     for (int index = 0; index < 100; ++index) {
         queue->async([&order, index] { order.push_back(index); });
     }
-    queue->async([&] { done.signal(); });
-    ASSERT_TRUE(done.waitFor(kGenerousSeconds));
+    queue->async([&] { done.release(); });
+    ASSERT_TRUE(done.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     std::vector<int> expected;
     for (int index = 0; index < 100; ++index) {
         expected.push_back(index);
@@ -38,15 +38,15 @@ TEST(DispatchQueueTest, TasksRunOnTheQueuesOwnThread) {
     EXPECT_FALSE(queue->isCurrent());
     std::vector<std::thread::id> threads;
     std::vector<bool> current;
-    Semaphore done;
+    std::counting_semaphore<> done{0};
     for (int index = 0; index < 3; ++index) {
         queue->async([&] {
             threads.push_back(std::this_thread::get_id());
             current.push_back(queue->isCurrent());
         });
     }
-    queue->async([&] { done.signal(); });
-    ASSERT_TRUE(done.waitFor(kGenerousSeconds));
+    queue->async([&] { done.release(); });
+    ASSERT_TRUE(done.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     ASSERT_EQ(threads.size(), 3u);
     EXPECT_NE(threads[0], std::this_thread::get_id());
     EXPECT_EQ(threads[1], threads[0]);
@@ -58,78 +58,78 @@ TEST(DispatchQueueTest, IsCurrentOnlyForItsOwnQueue) {
     auto first = DispatchQueue::create("first");
     auto second = DispatchQueue::create("second");
     bool secondCurrent = true;
-    Semaphore done;
+    std::counting_semaphore<> done{0};
     first->async([&] {
         secondCurrent = second->isCurrent();
-        done.signal();
+        done.release();
     });
-    ASSERT_TRUE(done.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(done.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     EXPECT_FALSE(secondCurrent);
 }
 
 TEST(DispatchQueueTest, AsyncFromATaskNeverRunsInline) {
     auto queue = DispatchQueue::create("inline");
     std::vector<std::string> order;
-    Semaphore done;
+    std::counting_semaphore<> done{0};
     queue->async([&] {
         queue->async([&] {
             order.push_back("inner");
-            done.signal();
+            done.release();
         });
         order.push_back("outer finished");
     });
-    ASSERT_TRUE(done.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(done.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     EXPECT_EQ(order, (std::vector<std::string>{"outer finished", "inner"}));
 }
 
 TEST(DispatchQueueTest, PendingTasksStillRunAfterTheLastReferenceGoes) {
     auto queue = DispatchQueue::create("drain");
-    Semaphore gate;
-    Semaphore allDone;
+    std::counting_semaphore<> gate{0};
+    std::counting_semaphore<> allDone{0};
     std::atomic<int> ran{0};
-    queue->async([&] { gate.waitFor(kGenerousSeconds); });
+    queue->async([&] { gate.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)); });
     for (int index = 0; index < 10; ++index) {
         queue->async([&] {
             if (++ran == 10) {
-                allDone.signal();
+                allDone.release();
             }
         });
     }
     queue.reset();  // returns without waiting for the blocked task
-    gate.signal();
-    ASSERT_TRUE(allDone.waitFor(kGenerousSeconds));
+    gate.release();
+    ASSERT_TRUE(allDone.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     EXPECT_EQ(ran.load(), 10);
 }
 
 TEST(DispatchQueueTest, LastReferenceMayGoInsideOneOfItsTasks) {
     auto queue = DispatchQueue::create("self");
-    Semaphore gate;
-    Semaphore released;
-    Semaphore laterRan;
+    std::counting_semaphore<> gate{0};
+    std::counting_semaphore<> released{0};
+    std::counting_semaphore<> laterRan{0};
     std::weak_ptr<DispatchQueue> watcher = queue;
     queue->async([held = queue, &gate, &released]() mutable {
-        gate.waitFor(kGenerousSeconds);
+        gate.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds));
         held.reset();  // the last reference: the queue object is destroyed here, on its own thread
-        released.signal();
+        released.release();
     });
-    queue->async([&] { laterRan.signal(); });
+    queue->async([&] { laterRan.release(); });
     queue.reset();
-    gate.signal();
-    ASSERT_TRUE(released.waitFor(kGenerousSeconds));
+    gate.release();
+    ASSERT_TRUE(released.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     EXPECT_TRUE(watcher.expired());
-    EXPECT_TRUE(laterRan.waitFor(kGenerousSeconds));
+    EXPECT_TRUE(laterRan.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
 }
 
 TEST(DispatchQueueTest, TaskHoldingTheLastReferenceReleasesItAfterRunning) {
     auto queue = DispatchQueue::create("captured");
     std::weak_ptr<DispatchQueue> watcher = queue;
-    Semaphore ran;
-    queue->async([held = queue, &ran] { ran.signal(); });
+    std::counting_semaphore<> ran{0};
+    queue->async([held = queue, &ran] { ran.release(); });
     queue.reset();
-    ASSERT_TRUE(ran.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(ran.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     // The task object (and with it the last reference) goes right after it ran.
     for (int attempt = 0; attempt < 1000 && !watcher.expired(); ++attempt) {
-        Semaphore().waitFor(0.01);
+        std::counting_semaphore<>(0).try_acquire_for(std::chrono::duration<double>(0.01));
     }
     EXPECT_TRUE(watcher.expired());
 }

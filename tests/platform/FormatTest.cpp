@@ -27,10 +27,5 @@ TEST(FormatTest, NegativeFieldWidthLeftAlignsWithItsAbsoluteWidth) {
     EXPECT_EQ(formatString("%*jd|", 2, intmax_t{7}), " 7|");
 }
 
-TEST(FormatTest, BytesAreWrittenAsTwoLowercaseHexDigitsAndASpaceEach) {
-    EXPECT_EQ(hexStringFromBytes({0x0a, 0xff, 0x00}), "0a ff 00 ");
-    EXPECT_EQ(hexStringFromBytes({}), "");
-}
-
 }  // namespace
 }  // namespace TolkaTouch

@@ -8,7 +8,7 @@
 #include <thread>
 #include <vector>
 
-#include "platform/Semaphore.h"
+#include <semaphore>
 
 namespace TolkaTouch {
 namespace {
@@ -214,10 +214,10 @@ TEST(RunLoopTest, RemovingTheLastSourceFromAnotherThreadFinishesAnEndlessRun) {
     auto loop = RunLoop::current();
     Pipe idle;
     const auto id = loop->addSource(idle.readEnd, "Drying", [] {});
-    Semaphore running;
-    loop->performBlock("Drying", [&] { running.signal(); });
+    std::counting_semaphore<> running{0};
+    loop->performBlock("Drying", [&] { running.release(); });
     std::thread remover([&] {
-        running.waitFor(kGenerousSeconds);
+        running.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds));
         loop->removeSource(id);
     });
     EXPECT_EQ(loop->runInMode("Drying", RunLoop::kInfinite, false), RunResult::Finished);
@@ -261,10 +261,10 @@ TEST(RunLoopTest, StopFromAnotherThreadEndsAnEndlessRun) {
     auto loop = RunLoop::current();
     Pipe idle;
     const auto id = loop->addSource(idle.readEnd, "Remote", [] {});
-    Semaphore running;
-    loop->performBlock("Remote", [&] { running.signal(); });
+    std::counting_semaphore<> running{0};
+    loop->performBlock("Remote", [&] { running.release(); });
     std::thread stopper([&] {
-        running.waitFor(kGenerousSeconds);
+        running.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds));
         loop->stop();
     });
     EXPECT_EQ(loop->runInMode("Remote", RunLoop::kInfinite, false), RunResult::Stopped);
@@ -288,20 +288,20 @@ TEST(RunLoopTest, WakeUpAloneDoesNotEndARun) {
     auto loop = RunLoop::current();
     Pipe idle;
     const auto id = loop->addSource(idle.readEnd, "Wake", [] {});
-    Semaphore running;
-    Semaphore wokenThrice;
-    loop->performBlock("Wake", [&] { running.signal(); });
+    std::counting_semaphore<> running{0};
+    std::counting_semaphore<> wokenThrice{0};
+    loop->performBlock("Wake", [&] { running.release(); });
     std::thread waker([&] {
-        running.waitFor(kGenerousSeconds);
+        running.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds));
         for (int index = 0; index < 3; ++index) {
             loop->wakeUp();
         }
-        wokenThrice.signal();
+        wokenThrice.release();
     });
     // Without returnAfterSourceHandled the block does not end the run, and neither do the
     // wake-ups: only the time-out does.
     EXPECT_EQ(loop->runInMode("Wake", 0.2, false), RunResult::TimedOut);
-    EXPECT_TRUE(wokenThrice.waitFor(kGenerousSeconds));
+    EXPECT_TRUE(wokenThrice.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     waker.join();
     loop->removeSource(id);
 }
@@ -309,25 +309,25 @@ TEST(RunLoopTest, WakeUpAloneDoesNotEndARun) {
 TEST(RunLoopTest, LoopOnItsOwnThreadStopsOnRequestLikeTheInputReportThread) {
     const std::string mode = "kHandleInputReportsRunLoopMode";
     std::shared_ptr<RunLoop> published;
-    Semaphore signal;
+    std::counting_semaphore<> signal{0};
     Pipe idle;
     std::vector<RunResult> answers;
     std::thread worker([&] {
         published = RunLoop::current();
         const auto id = published->addSource(idle.readEnd, mode, [] {});
-        signal.signal();
+        signal.release();
         RunResult answer;
         do {
             answer = RunLoop::current()->runInMode(mode, RunLoop::kInfinite, true);
             answers.push_back(answer);
         } while (answer == RunResult::HandledSource);
         RunLoop::current()->removeSource(id);
-        signal.signal();
+        signal.release();
     });
-    ASSERT_TRUE(signal.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(signal.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     published->performBlock(mode, [] { RunLoop::current()->stop(); });
     published->wakeUp();
-    ASSERT_TRUE(signal.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(signal.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     worker.join();
     EXPECT_EQ(answers, (std::vector<RunResult>{RunResult::Stopped}));
 }
@@ -335,19 +335,19 @@ TEST(RunLoopTest, LoopOnItsOwnThreadStopsOnRequestLikeTheInputReportThread) {
 TEST(RunLoopTest, RemovingASourceFromAnotherThreadWaitsForItsRunningCallback) {
     auto loop = RunLoop::current();
     Pipe pipe;
-    Semaphore entered;
-    Semaphore neverSignalled;
+    std::counting_semaphore<> entered{0};
+    std::counting_semaphore<> neverSignalled{0};
     std::atomic<bool> callbackFinished{false};
     const auto id = loop->addSource(pipe.readEnd, "Busy", [&] {
         pipe.take();
-        entered.signal();
+        entered.release();
         // Keep the callback busy for a moment so that the removal really has to wait for it.
-        neverSignalled.waitFor(0.05);
+        neverSignalled.try_acquire_for(std::chrono::duration<double>(0.05));
         callbackFinished.store(true);
     });
     bool finishedWhenRemoved = false;
     std::thread remover([&] {
-        entered.waitFor(kGenerousSeconds);
+        entered.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds));
         loop->removeSource(id);
         finishedWhenRemoved = callbackFinished.load();
     });

@@ -6,7 +6,7 @@
 #include <vector>
 
 #include "platform/RunLoop.h"
-#include "platform/Semaphore.h"
+#include <semaphore>
 
 namespace TolkaTouch {
 namespace {
@@ -30,7 +30,7 @@ struct Receiver {
     };
     std::vector<Report> reports;
     std::vector<const uint8_t*> pointers;
-    Semaphore* arrived = nullptr;
+    std::counting_semaphore<>* arrived = nullptr;
     HIDDevice* unregisterOnFirst = nullptr;
 
     static void callback(void* context, uint32_t result, void* sender, HIDReportType type, uint32_t reportID,
@@ -42,7 +42,7 @@ struct Receiver {
             self->unregisterOnFirst->registerInputReportCallback(nullptr, 0, nullptr, nullptr);
         }
         if (self->arrived) {
-            self->arrived->signal();
+            self->arrived->release();
         }
     }
 };
@@ -320,30 +320,30 @@ TEST(SimulatedHIDDeviceTest, ReportsFlowToALoopOnItsOwnThreadUntilItIsStopped) {
     auto device = SimulatedHIDDevice::create();
     device->open(0);
     Receiver receiver;
-    Semaphore arrived;
+    std::counting_semaphore<> arrived{0};
     receiver.arrived = &arrived;
     std::shared_ptr<RunLoop> published;
-    Semaphore signal;
+    std::counting_semaphore<> signal{0};
     std::thread worker([&] {
         uint8_t buffer[512];
         device->registerInputReportCallback(buffer, sizeof buffer, Receiver::callback, &receiver);
         device->scheduleWithRunLoop(*RunLoop::current(), mode);
         published = RunLoop::current();
-        signal.signal();
+        signal.release();
         while (RunLoop::current()->runInMode(mode, RunLoop::kInfinite, true) == RunResult::HandledSource) {
         }
         device->unscheduleFromRunLoop(*RunLoop::current(), mode);
         device->registerInputReportCallback(buffer, sizeof buffer, nullptr, nullptr);
-        signal.signal();
+        signal.release();
     });
-    ASSERT_TRUE(signal.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(signal.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     for (uint8_t index = 0; index < 20; ++index) {
         device->writeInputReport(Bytes{0x01, index});
-        ASSERT_TRUE(arrived.waitFor(kGenerousSeconds));
+        ASSERT_TRUE(arrived.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     }
     published->performBlock(mode, [] { RunLoop::current()->stop(); });
     published->wakeUp();
-    ASSERT_TRUE(signal.waitFor(kGenerousSeconds));
+    ASSERT_TRUE(signal.try_acquire_for(std::chrono::duration<double>(kGenerousSeconds)));
     worker.join();
     ASSERT_EQ(receiver.reports.size(), 20u);
     for (uint8_t index = 0; index < 20; ++index) {

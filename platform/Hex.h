@@ -1,0 +1,24 @@
+#pragma once
+// The hex text of byte data, one codec for everyone: two lower-case digits per byte, spaced as the
+// caller's format requires; and the strict reading of digit pairs written by people.
+
+#include <cstdint>
+#include <span>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace TolkaTouch::Hex {
+
+enum class Spacing {
+    AfterEach,  // "0a ff 00 ": the recording form, a space after every byte
+    Between,    // "0a ff 00": the readable form of a value, spaces between bytes
+};
+
+std::string text(std::span<const uint8_t> bytes, Spacing spacing);
+
+// Pairs of hex digits (either case), the characters in `ignored` skipped wherever they stand.
+// Throws std::invalid_argument "not hex" or "odd number of hex digits".
+std::vector<uint8_t> bytesFromPairs(std::string_view text, std::string_view ignored = " ");
+
+}  // namespace TolkaTouch::Hex
