@@ -357,6 +357,20 @@ TEST_F(AlgsTest, HoldTimeoutOfOneSecondTurnsASevenHundredMillisecondPressIntoATa
     EXPECT_EQ(algs.eventStats.numTaps, 1u);
 }
 
+TEST_F(AlgsTest, AHoldEndedByRaisingTheTimeoutIsFollowedByATapWhenTheFingerLifts) {
+    Algs algs;
+    TouchScript script(algs);
+    script.touch("CD", 600, 1016, 1904);
+    EXPECT_EQ(script.playUntil(1600), (Events{mayBegin(1, script.frameAt(1016)), holdStart(1, script.frameAt(1520))}));
+    algs.setState("HoldTimeoutMilliseconds", PropertyValue(2000u));
+    // The finger stays: the hold ends at once, and the frame reads as a touch going on.
+    EXPECT_EQ(script.playUntil(1608), (Events{holdEnd(1, script.frameAt(1608))}));
+    EXPECT_EQ(algs.verdict().transition, Transition::HoldEnded);
+    EXPECT_EQ(algs.snapshot().touching, true);
+    // Lifted before the new timeout, the same touch also stands as a tap.
+    EXPECT_EQ(script.playUntil(2000), (Events{tap(1, script.frameAt(1904))}));
+}
+
 TEST_F(AlgsTest, WithoutHoldSuppressionALowScoreTouchBecomesAHold) {
     Algs suppressed;
     TouchScript suppressedScript(suppressed);
