@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "plugin/HIDServicePlugin.h"
+#include "tolkatouch/HIDServicePlugin.h"
 
 namespace TolkaTouch {
 

@@ -10,7 +10,7 @@
 #include "platform/DispatchQueue.h"
 #include "platform/HIDEvent.h"
 #include "platform/PropertyValue.h"
-#include "plugin/HIDServicePlugin.h"
+#include "tolkatouch/HIDServicePlugin.h"
 
 namespace TolkaTouch {
 

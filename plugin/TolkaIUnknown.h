@@ -7,7 +7,7 @@
 
 #include <cstdint>
 
-#include "plugin/HIDServicePlugin.h"
+#include "tolkatouch/HIDServicePlugin.h"
 
 namespace TolkaTouch::TolkaIUnknown {
 

@@ -1,5 +1,5 @@
 // The plug-in library's one exported symbol: the host's way in.
-#include "plugin/HIDServicePlugin.h"
+#include "tolkatouch/HIDServicePlugin.h"
 #include "plugin/TolkaTouchHIDService.h"
 
 using TolkaTouch::TolkaTouchHIDService;

@@ -19,7 +19,7 @@
 #include "platform/Log.h"
 #include "platform/SimulatedHIDDevice.h"
 #include "platform/Trace.h"
-#include "plugin/HIDServicePlugin.h"
+#include "tolkatouch/HIDServicePlugin.h"
 #include "plugin/TolkaTouchHIDService.h"
 
 namespace TolkaTouch {

@@ -20,7 +20,7 @@
 #include "platform/RunLoop.h"
 #include "platform/SimulatedHIDDevice.h"
 #include "platform/Trace.h"
-#include "plugin/HIDServicePlugin.h"
+#include "tolkatouch/HIDServicePlugin.h"
 
 namespace TolkaTouch::Testing {
 
