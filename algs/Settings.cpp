@@ -149,6 +149,10 @@ const Setting* findSetting(std::string_view key) {
     return nullptr;
 }
 
+bool isSettingKeyForm(std::string_view key) {
+    return key.starts_with("Pipeline.") || key.starts_with(kAlgsPrefix) || findSetting(key) != nullptr;
+}
+
 std::string nearestSettingKey(std::string_view key) {
     const auto [prefix, bare] = splitKey(key);
     const Setting* nearest = nullptr;

@@ -2,6 +2,7 @@
 
 #include "daemon/ControlServer.h"
 #include "platform/PropertyValueJson.h"
+#include "tolkatouch/Settings.h"
 
 namespace TolkaTouch {
 
@@ -53,7 +54,20 @@ std::string answerControlRequest(const std::string& line, ControlTarget& target)
         if (!it->is_string() || value == request.end()) {
             return error("malformed request: \"set\" takes a key string and a \"value\"");
         }
-        auto ok = target.setProperty(service, it->get<std::string>(), PropertyValueJson::fromJson(*value));
+        std::string key = it->get<std::string>();
+        PropertyValue written = PropertyValueJson::fromJson(*value);
+        // Settings are checked against the settings table, so that no made-up key is recorded and
+        // no value outside a setting's range reaches the recognizer; other keys pass as they are.
+        if (isSettingKeyForm(key)) {
+            try {
+                const CheckedSetting checked = checkSetting(key, written);
+                key = checked.setting->propertyKey();
+                written = checked.value;
+            } catch (const SettingError& refusal) {
+                return error(refusal.what());
+            }
+        }
+        auto ok = target.setProperty(service, key, written);
         if (!ok) return noSuchDevice(service);
         return dump(json{{"ok", *ok}});
     }

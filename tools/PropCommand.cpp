@@ -13,6 +13,7 @@
 #include "tools/ControlClient.h"
 #include "tools/DocumentFile.h"
 #include "tools/SettingValue.h"
+#include "tolkatouch/Settings.h"
 
 namespace TolkaTouch::Tools {
 
@@ -46,7 +47,18 @@ void runGet(const PropArguments& arguments) {
 }
 
 void runSet(const PropArguments& arguments) {
-    nlohmann::json request = {{"set", arguments.key}, {"value", nlohmann::json(PropertyValueJson::toJson(settingValueFromText(arguments.value)))}};
+    // A setting is checked against the settings table and sent in the property's own form; the
+    // service's own keys and the device's pass as they are.
+    std::string key = arguments.key;
+    PropertyValue value;
+    if (isSettingKeyForm(key)) {
+        const CheckedSetting checked = checkSetting(key, arguments.value);
+        key = checked.setting->propertyKey();
+        value = checked.value;
+    } else {
+        value = settingValueFromText(arguments.value);
+    }
+    nlohmann::json request = {{"set", key}, {"value", nlohmann::json(PropertyValueJson::toJson(value))}};
     auto reply = controlRequest(arguments.socket, withDevice(request, arguments.device), arguments.key);
     if (reply.value("ok", false) != true) throw ToolError(arguments.key, "the service did not take the value");
 }

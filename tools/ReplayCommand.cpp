@@ -7,14 +7,14 @@
 
 #include <CLI/CLI.hpp>
 
-#include "tolkatouch/Gesture.h"
 #include "platform/Log.h"
+#include "tolkatouch/Gesture.h"
+#include "tolkatouch/Settings.h"
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"
 #include "tools/EventPrinter.h"
 #include "tools/Replayer.h"
 #include "tools/SampleRecording.h"
-#include "tools/SettingValue.h"
 #include "tools/StatsPrinter.h"
 
 namespace TolkaTouch::Tools {
@@ -43,7 +43,10 @@ void runReplay(const ReplayArguments& arguments) {
     ReplayOptions options;
     options.speed = arguments.speed;
     options.fast = arguments.fast;
-    for (const std::string& assignment : arguments.settings) options.settings.push_back(settingFromAssignment(assignment));
+    for (const std::string& assignment : arguments.settings) {
+        const CheckedSetting checked = checkSettingAssignment(assignment);
+        options.settings.emplace_back(checked.setting->algsKey(), checked.value);
+    }
 
     if (arguments.describe) {
         SystemLog::setDefaultDestination(SystemLog::Destination::StandardError);

@@ -7,6 +7,7 @@
 #include <CLI/CLI.hpp>
 
 #include "tools/Commands.h"
+#include "tolkatouch/Settings.h"
 #include "tools/DocumentFile.h"
 
 namespace {
@@ -38,6 +39,10 @@ int main(int argc, char** argv) {
         // Help is an answer, not an error; anything else the parser refuses is a usage error.
         if (error.get_exit_code() == static_cast<int>(CLI::ExitCodes::Success)) return app.exit(error);
         app.exit(error);
+        return kExitUsage;
+    } catch (const TolkaTouch::SettingError& error) {
+        std::fflush(stdout);
+        std::fprintf(stderr, "tolkatouch: %s\n", error.what());
         return kExitUsage;
     } catch (const ToolError& error) {
         std::fflush(stdout);

@@ -40,6 +40,11 @@ const std::vector<Setting>& settingsTable();
 // A setting by any accepted form of its key: "X", "Algs.X" or "Pipeline.Algs.X"; nullptr if none.
 const Setting* findSetting(std::string_view key);
 
+// A key written where only the table's settings can be written: in the "Pipeline" or "Algs"
+// domain, or one of the table's bare keys. Writes of such keys are checked; other keys (the
+// service's own, the device's) pass as they are.
+bool isSettingKeyForm(std::string_view key);
+
 // The table's key nearest to a mistyped one, in the form the mistyped one was given.
 std::string nearestSettingKey(std::string_view key);
 

@@ -64,6 +64,15 @@ TEST(SettingsTest, KeysAreFoundInAllThreeForms) {
     EXPECT_EQ(findSetting("holdtimeoutmilliseconds"), nullptr);
 }
 
+TEST(SettingsTest, KeysOfThePipelineAndAlgsDomainsAreSettingKeysAndOthersPass) {
+    EXPECT_TRUE(isSettingKeyForm("Pipeline.Algs.Bogus"));
+    EXPECT_TRUE(isSettingKeyForm("Pipeline.DebugInfo"));
+    EXPECT_TRUE(isSettingKeyForm("Algs.HoldTimeoutMiliseconds"));
+    EXPECT_TRUE(isSettingKeyForm("ActivationThreshold"));
+    EXPECT_FALSE(isSettingKeyForm("ServicePluginDebug"));
+    EXPECT_FALSE(isSettingKeyForm("Version"));
+}
+
 TEST(SettingsTest, AMisspeltKeyIsRefusedWithTheNearestKeyInTheSameForm) {
     EXPECT_EQ(errorOf("Algs.HoldTimeoutMiliseconds", "1000"),
               "unknown setting \"Algs.HoldTimeoutMiliseconds\" (did you mean \"Algs.HoldTimeoutMilliseconds\"?)");

@@ -1,5 +1,6 @@
 #include "daemon/ControlRequests.h"
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <map>
@@ -60,6 +61,36 @@ TEST(ControlRequestsTest, SetPassesTheValueAndAnswersTheServicesResult) {
               R"({"ok":true})");
     EXPECT_EQ(target.properties["Pipeline.Algs.HoldTimeoutMilliseconds"], PropertyValue(400u));
     EXPECT_EQ(answerControlRequest(R"({"set": "Refused", "value": "x"})", target), R"({"ok":false})");
+}
+
+TEST(ControlRequestsTest, ASettingInAnyKeyFormIsWrittenInThePropertysFormWithItsTableType) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"set": "Algs.ActivationThreshold", "value": 250})", target), R"({"ok":true})");
+    EXPECT_EQ(target.properties["Pipeline.Algs.ActivationThreshold"], PropertyValue(250.0));
+    EXPECT_EQ(answerControlRequest(R"({"set": "EnableTapSuppression", "value": false})", target), R"({"ok":true})");
+    EXPECT_EQ(target.properties["Pipeline.Algs.EnableTapSuppression"], PropertyValue(false));
+}
+
+TEST(ControlRequestsTest, AMadeUpSettingIsRefusedAndNothingReachesTheService) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"set": "Pipeline.Algs.HoldTimeoutMiliseconds", "value": 400})", target),
+              R"x({"error":"unknown setting \"Pipeline.Algs.HoldTimeoutMiliseconds\" (did you mean \"Pipeline.Algs.HoldTimeoutMilliseconds\"?)"})x");
+    EXPECT_THAT(answerControlRequest(R"({"set": "Pipeline.Junk17", "value": 1})", target),
+                testing::StartsWith(R"({"error":"unknown setting \"Pipeline.Junk17\" (did you mean )"));
+    EXPECT_TRUE(target.properties.empty());
+}
+
+TEST(ControlRequestsTest, ASettingValueOutsideItsRangeIsRefusedWithTheRange) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"set": "Pipeline.Algs.HoldTimeoutMilliseconds", "value": "banana"})", target),
+              R"({"error":"setting \"Pipeline.Algs.HoldTimeoutMilliseconds\" takes a whole number of milliseconds from 1 to 60000, not \"banana\""})");
+    EXPECT_TRUE(target.properties.empty());
+}
+
+TEST(ControlRequestsTest, KeysOutsideTheSettingsDomainsPassAsTheyAre) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"set": "ServicePluginDebug", "value": 3})", target), R"({"ok":true})");
+    EXPECT_EQ(target.properties["ServicePluginDebug"], PropertyValue(3u));
 }
 
 TEST(ControlRequestsTest, DevicesListsServiceNodeAndIds) {

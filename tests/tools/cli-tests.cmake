@@ -113,3 +113,16 @@ tolka_add_cli_test(ShowListsResetsAndImagesInOrder
   --stdout ${expected}/short-with-reset.show.txt -- show ${data}/short-with-reset.json)
 tolka_add_cli_test(ConvertOfTheVersionZeroExampleWritesVersionOne
   --stdout ${expected}/version0-session.converted.json -- convert ${examples}/version0-session.json -o -)
+
+# Settings are checked against the settings table before anything is played.
+tolka_add_cli_test(ReplayWithAMisspeltSettingNamesTheNearestKeyAndExitsTwo
+  --exit 2 --stdout-empty
+  --stderr-text "tolkatouch: unknown setting \"Algs.HoldTimeoutMiliseconds\" (did you mean \"Algs.HoldTimeoutMilliseconds\"?)"
+  -- replay --fast --set Algs.HoldTimeoutMiliseconds=1000 ${examples}/reset-during-hold.json)
+tolka_add_cli_test(ReplayWithASettingValueOfTheWrongTypeNamesTheRangeAndExitsTwo
+  --exit 2 --stdout-empty
+  --stderr-text "tolkatouch: setting \"Algs.HoldTimeoutMilliseconds\" takes a whole number of milliseconds from 1 to 60000, not \"banana\""
+  -- replay --fast --set Algs.HoldTimeoutMilliseconds=banana ${examples}/reset-during-hold.json)
+tolka_add_cli_test(ReplayTakesTheSettingInThePropertysKeyFormToo
+  --stdout ${expected}/everyday-session.hold-timeout-1000.jsonl
+  -- replay --fast --json --set Pipeline.Algs.HoldTimeoutMilliseconds=1000 ${examples}/everyday-session.json)
