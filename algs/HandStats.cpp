@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <stdexcept>
+#include <utility>
 
 namespace TolkaTouch {
 
@@ -12,6 +14,13 @@ constexpr float kE2 = 7.389056f;
 
 size_t slot(PixelRegion region) { return static_cast<size_t>(region); }
 
+// Element i with a range test, failing as the standard containers' range test does.
+template <typename T>
+const T& elementAt(std::span<const T> elements, size_t i) {
+    if (i >= elements.size()) throw std::out_of_range("vector");
+    return elements[i];
+}
+
 // Order key of the region sort: largest maxNormalizedAboveNoise first. A key that is not a number
 // (only with a divisor that is not one) sorts last, so the order stays a strict weak one.
 float sortKey(const Pixel& pixel) {
@@ -19,15 +28,40 @@ float sortKey(const Pixel& pixel) {
     return std::isnan(key) ? -std::numeric_limits<float>::infinity() : key;
 }
 
+// The region sort's order: largest key first, equal keys in ascending index order.
+bool precedes(const Pixel& a, const Pixel& b) {
+    if (sortKey(a) != sortKey(b)) return sortKey(a) > sortKey(b);
+    return a.index < b.index;
+}
+
 }  // namespace
 
 std::vector<Pixel> sortByMaxNormalizedAboveNoise(std::vector<Pixel> pixels) {
-    std::sort(pixels.begin(), pixels.end(), [](const Pixel& a, const Pixel& b) {
-        if (sortKey(a) != sortKey(b)) return sortKey(a) > sortKey(b);
-        return a.index < b.index;
-    });
+    std::sort(pixels.begin(), pixels.end(), precedes);
     return pixels;
 }
+
+namespace {
+
+// The first two of the region sort, found in one pass instead of sorting a copy every frame.
+std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels) {
+    if (pixels.size() < 2) throw std::out_of_range("vector");
+    const Pixel* first = &pixels[0];
+    const Pixel* second = &pixels[1];
+    if (precedes(*second, *first)) std::swap(first, second);
+    for (size_t i = 2; i < pixels.size(); ++i) {
+        const Pixel* p = &pixels[i];
+        if (precedes(*p, *first)) {
+            second = first;
+            first = p;
+        } else if (precedes(*p, *second)) {
+            second = p;
+        }
+    }
+    return {first, second};
+}
+
+}  // namespace
 
 HandStats::HandStats() = default;
 
@@ -40,7 +74,7 @@ void HandStats::Reset() {
     maxOnIndex = 0;
 }
 
-void HandStats::updateHandState(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+void HandStats::updateHandState(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                                 unsigned int time) {
     // 1. Scan the real pixels, then the virtual ones: the strongest on element since the last
     // Reset, whether anything is on or above noise, and this frame's strongest element.
@@ -179,7 +213,7 @@ FrameVerdict HandStats::verdict() const {
     return verdict;
 }
 
-void HandStats::updateTouchScore(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+void HandStats::updateTouchScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                                  unsigned int time) {
     // 1.
     svm.updateSVMScore(pixels, virtualPixels, ActivationThreshold);
@@ -220,7 +254,7 @@ float HandStats::fuzzifyAndClip(float x, float x0, float x1, float y0, float y1)
     return fuzzify(x, x0, x1, y0, y1);
 }
 
-void HandStats::updateRegionMax(const std::vector<Pixel>& pixels) {
+void HandStats::updateRegionMax(std::span<const Pixel> pixels) {
     std::fill(regionMax.begin(), regionMax.end(), 0.0f);
     for (const Pixel& pixel : pixels) {
         const PixelRegion r = pixelRegionOfIndex(pixel.index);
@@ -229,15 +263,15 @@ void HandStats::updateRegionMax(const std::vector<Pixel>& pixels) {
     }
 }
 
-PixelRegion HandStats::updateActiveRegion(const std::vector<Pixel>& pixels,
-                                          const std::vector<VirtualPixel>& virtualPixels, unsigned int time) {
+PixelRegion HandStats::updateActiveRegion(std::span<const Pixel> pixels,
+                                          std::span<const VirtualPixel> virtualPixels, unsigned int time) {
     // 1. The region of the strongest on element since the last Reset.
     PixelRegion r = pixelRegionOfIndex(maxOnIndex);
 
     // 2. The two pixels strongest above noise over this touch; equal keys keep index order.
-    const std::vector<Pixel> sorted = sortByMaxNormalizedAboveNoise(pixels);
-    const Pixel& first = sorted.at(0);
-    const Pixel& second = sorted.at(1);
+    const auto [firstPixel, secondPixel] = twoFirstByMaxNormalizedAboveNoise(pixels);
+    const Pixel& first = *firstPixel;
+    const Pixel& second = *secondPixel;
 
     // 3. Soon after a tap or hold end the last event's region is favoured.
     const float b = updateTimeBiasFactor(time);
@@ -258,13 +292,13 @@ PixelRegion HandStats::updateActiveRegion(const std::vector<Pixel>& pixels,
     constexpr size_t kGroupIJK = 18;
     constexpr size_t kGroupKLM = 19;
     if (maxOnIndex == kPixelK && second.maxNormalizedAboveNoise > noiseLevel && first.index == kPixelK) {
-        const float centre = pixels.at(kPixelK).maxNormalizedAboveNoise;
+        const float centre = elementAt(pixels, kPixelK).maxNormalizedAboveNoise;
         if (second.index == kPixelM) {
             const float f = eventRegion == PixelRegion::VolumeDown ? std::min(b, 0.7f) : 0.7f;
-            if (virtualPixels.at(kGroupKLM).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeDown;
+            if (elementAt(virtualPixels, kGroupKLM).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeDown;
         } else if (second.index == kPixelI) {
             const float f = eventRegion == PixelRegion::VolumeUp ? std::min(b, 0.7f) : 0.7f;
-            if (virtualPixels.at(kGroupIJK).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeUp;
+            if (elementAt(virtualPixels, kGroupIJK).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeUp;
         }
     }
 
@@ -273,7 +307,7 @@ PixelRegion HandStats::updateActiveRegion(const std::vector<Pixel>& pixels,
     return r;
 }
 
-PixelRegion HandStats::changeActiveRegion(const std::vector<Pixel>& pixels, int index) {
+PixelRegion HandStats::changeActiveRegion(std::span<const Pixel> pixels, int index) {
     // 1.
     previousActiveRegion = activeRegion;
     const PixelRegion c = activeRegion;
@@ -304,7 +338,7 @@ PixelRegion HandStats::changeActiveRegion(const std::vector<Pixel>& pixels, int 
     return regionMax[slot(n)] / mNow >= k * q ? n : c;
 }
 
-void HandStats::updateTapRejection(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels) {
+void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels) {
     // 1.
     peakStrength = maxOnStrength * ActivationThreshold;
 

@@ -4,6 +4,7 @@
 // is a tap; keeps the running touch score, the edge times of the touch and the active region.
 
 #include <cstdint>
+#include <span>
 #include <vector>
 
 #include "algs/Pixel.h"
@@ -32,10 +33,10 @@ public:
 
     // One frame at the firmware time `time` (ms). The pixels are this frame's snapshot; they are
     // only read.
-    void updateHandState(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+    void updateHandState(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                          unsigned int time);
 
-    void updateTouchScore(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+    void updateTouchScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                           unsigned int time);
     void decayTouchScore(unsigned int time);
     float updateTimeBiasFactor(unsigned int time);
@@ -43,11 +44,11 @@ public:
     float fuzzifyAndClip(float x, float x0, float x1, float y0, float y1);
 
     // Active region and tap rejection.
-    void updateRegionMax(const std::vector<Pixel>& pixels);
-    PixelRegion updateActiveRegion(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+    void updateRegionMax(std::span<const Pixel> pixels);
+    PixelRegion updateActiveRegion(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                                    unsigned int time);
-    PixelRegion changeActiveRegion(const std::vector<Pixel>& pixels, int index);
-    void updateTapRejection(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels);
+    PixelRegion changeActiveRegion(std::span<const Pixel> pixels, int index);
+    void updateTapRejection(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels);
 
     SVM svm;
     float touchScore = 0.0f;                 // clamped to +-scoreLimit

@@ -48,7 +48,7 @@ SVM::SVM() {
     }
 }
 
-void SVM::updateSVMScore(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                          float gate) {
     // 1.
     score = 0.0f;

@@ -2,6 +2,7 @@
 // SVM: the tap classifier. A fixed linear classifier over the rank-ordered values of the 15 real
 // and 23 virtual pixels that scores how much one frame looks like a deliberate touch.
 
+#include <span>
 #include <vector>
 
 #include "algs/Pixel.h"
@@ -14,7 +15,7 @@ public:
     SVM();
 
     // This frame's score; 0 for a quiet frame (nothing above gate and nothing else above noise).
-    void updateSVMScore(const std::vector<Pixel>& pixels, const std::vector<VirtualPixel>& virtualPixels,
+    void updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                         float gate);
     float getSVMScore() const { return score; }
 

@@ -24,6 +24,24 @@ constexpr std::array<GroupDefinition, 23> kGroups{{
     {"LMN", 0.4444f},  {"LMO", 0.5714f},  {"MNO", 0.6667f},
 }};
 
+// Each group's member pixels as indices, looked up once from its letters.
+struct GroupMembers {
+    std::array<uint8_t, 4> index{};
+    size_t count = 0;
+};
+
+constexpr std::array<GroupMembers, kGroups.size()> membersOf() {
+    std::array<GroupMembers, kGroups.size()> all{};
+    for (size_t g = 0; g < kGroups.size(); ++g) {
+        for (const char* letter = kGroups[g].letters; *letter != '\0'; ++letter) {
+            all[g].index[all[g].count++] = static_cast<uint8_t>(*letter - 'A');
+        }
+    }
+    return all;
+}
+
+constexpr auto kMembers = membersOf();
+
 // Element i with a range test: an index outside the vector raises the standard out-of-range
 // failure with the message "vector".
 template <typename T>
@@ -33,7 +51,7 @@ T& checkedAt(std::vector<T>& vector, size_t i) {
 }
 
 template <typename T>
-const T& checkedAt(const std::vector<T>& vector, size_t i) {
+const T& checkedAt(std::span<const T> vector, size_t i) {
     if (i >= vector.size()) throw std::out_of_range("vector");
     return vector[i];
 }
@@ -54,9 +72,31 @@ VirtualImage::VirtualImage() {
     }
 }
 
-void VirtualImage::updateValues(const std::vector<Pixel>& pixels) {
+void VirtualImage::updateValues(std::span<const Pixel> pixels) {
     // 1. Sums start afresh; the strongest members carry over from the last frame.
     std::fill(values.begin(), values.end(), 0);
+
+    // The surface's own 15 pixels and the fixed groups: the members were looked up once.
+    if (pixels.size() == kPixelCount && groups.size() == kGroups.size() && values.size() == kGroups.size() &&
+        strongest.size() == kGroups.size()) {
+        for (size_t g = 0; g < kGroups.size(); ++g) {
+            const GroupMembers& members = kMembers[g];
+            int32_t sum = 0;
+            int32_t strongestIndex = strongest[g];
+            for (size_t m = 0; m < members.count; ++m) {
+                const size_t i = members.index[m];
+                const int32_t v = pixels[i].value;
+                if (v >= Pixel::kNoiseLevel + 1) {
+                    sum += v;
+                    if (static_cast<size_t>(strongestIndex) >= kPixelCount) throw std::out_of_range("vector");
+                    if (v > pixels[static_cast<size_t>(strongestIndex)].value) strongestIndex = static_cast<int32_t>(i);
+                }
+            }
+            values[g] = sum;
+            strongest[g] = strongestIndex;
+        }
+        return;
+    }
 
     // 2. Members above noise add their value; a member takes over as strongest only when strictly
     // stronger than this frame's value of the one recorded, so ties keep the old one and, among

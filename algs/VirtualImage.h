@@ -3,6 +3,7 @@
 // summed strength, strongest member and normalisation factor.
 
 #include <cstdint>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -15,7 +16,7 @@ public:
     VirtualImage();
 
     // This frame's group sums and strongest members from the real pixels' values.
-    void updateValues(const std::vector<Pixel>& pixels);
+    void updateValues(std::span<const Pixel> pixels);
 
     std::vector<int32_t> values;               // summed strength of the members above noise
     std::vector<std::string> groups;           // the letters of each group

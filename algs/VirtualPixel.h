@@ -18,4 +18,9 @@ public:
     std::string name;  // the group's letters, e.g. "ADEF"
 };
 
+inline void VirtualPixel::updatePixelState(int value, float divisor, int index) {
+    Pixel::updatePixelState(value, divisor);
+    this->index = index;
+}
+
 }  // namespace TolkaTouch
