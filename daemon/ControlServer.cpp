@@ -30,6 +30,24 @@ std::runtime_error systemError(const std::string& what) {
     return std::runtime_error(what + ": " + std::strerror(errno));
 }
 
+// A socket file at the path that nothing listens on is removed; a missing path is fine; any other
+// file, or a socket that answers, is an error and is left as it is.
+void removeStaleSocket(const std::string& path, const sockaddr_un& address, int lockFd) {
+    struct stat existing {};
+    if (::lstat(path.c_str(), &existing) != 0) return;
+    auto refuse = [&](const std::string& message) {
+        ::close(lockFd);
+        return std::runtime_error(message);
+    };
+    if (!S_ISSOCK(existing.st_mode)) throw refuse(path + " exists and is not a socket; not replacing it");
+    const int probe = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    const bool answered =
+        probe >= 0 && ::connect(probe, reinterpret_cast<const sockaddr*>(&address), sizeof(address)) == 0;
+    if (probe >= 0) ::close(probe);
+    if (answered) throw refuse("something else listens on " + path + "; not replacing it");
+    ::unlink(path.c_str());
+}
+
 sockaddr_un socketAddress(const std::string& path) {
     sockaddr_un address{};
     address.sun_family = AF_UNIX;
@@ -57,8 +75,9 @@ ControlServer::ControlServer(std::string path, Handler handler, OversizeReply ov
         errno = error;
         throw systemError("cannot lock " + lockPath);
     }
-    // Holding the lock, a socket file left at the path belongs to a daemon that is gone.
-    ::unlink(_path.c_str());
+    // Holding the lock, a socket file left at the path belongs to a daemon that is gone; anything
+    // else there (a file given by mistake, a socket something else listens on) is left alone.
+    removeStaleSocket(_path, address, _lockFd);
 
     auto fail = [this](const std::string& what) {
         auto error = systemError(what);
@@ -69,11 +88,15 @@ ControlServer::ControlServer(std::string path, Handler handler, OversizeReply ov
     };
     _listenFd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_NONBLOCK | SOCK_CLOEXEC, 0);
     if (_listenFd < 0) throw fail("cannot create the control socket");
-    if (::bind(_listenFd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
-        throw fail("cannot bind the control socket " + _path);
-    }
-    if (::chmod(_path.c_str(), 0660) != 0) throw fail("cannot set the mode of " + _path);
-    if (::listen(_listenFd, 16) != 0) throw fail("cannot listen on " + _path);
+    // The socket file is born with mode 0660: no moment in which others could connect.
+    const mode_t previousMask = ::umask(0117);
+    const int bound = ::bind(_listenFd, reinterpret_cast<sockaddr*>(&address), sizeof(address));
+    ::umask(previousMask);
+    if (bound != 0) throw fail("cannot bind the control socket " + _path);
+    struct stat made {};
+    if (::lstat(_path.c_str(), &made) == 0) _socketInode = made.st_ino;
+    if (::listen(_listenFd, kListenBacklog) != 0) throw fail("cannot listen on " + _path);
+    _reserveFd = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
     _epollFd = ::epoll_create1(EPOLL_CLOEXEC);
     if (_epollFd < 0) throw fail("cannot create the control socket's epoll set");
     epoll_event event{};
@@ -89,7 +112,12 @@ ControlServer::~ControlServer() {
     _clients.clear();
     ::close(_epollFd);
     ::close(_listenFd);
-    ::unlink(_path.c_str());
+    if (_reserveFd >= 0) ::close(_reserveFd);
+    // Only the socket this server made: the path may have been given to something else since.
+    struct stat now {};
+    if (::lstat(_path.c_str(), &now) == 0 && S_ISSOCK(now.st_mode) && now.st_ino == _socketInode) {
+        ::unlink(_path.c_str());
+    }
     ::close(_lockFd);
 }
 
@@ -113,7 +141,16 @@ void ControlServer::handleReady() {
 void ControlServer::accept() {
     for (;;) {
         int fd = ::accept4(_listenFd, nullptr, nullptr, SOCK_NONBLOCK | SOCK_CLOEXEC);
+        if (fd < 0 && (errno == EMFILE || errno == ENFILE)) {
+            acceptWithoutDescriptors();
+            return;
+        }
+        if (fd < 0 && errno == EINTR) continue;
         if (fd < 0) return;  // EAGAIN, or a client that left before we took it
+        if (_clients.size() >= kMaxClients) {
+            refuse(fd, "too many clients (at most " + std::to_string(kMaxClients) + ")");
+            continue;
+        }
         auto client = std::make_unique<Client>();
         client->fd = fd;
         epoll_event event{};
@@ -125,6 +162,24 @@ void ControlServer::accept() {
         }
         _clients.emplace(fd, std::move(client));
     }
+}
+
+void ControlServer::refuse(int fd, const std::string& reply) {
+    // One line, best effort: the client is closed whether or not it reads it.
+    const std::string line = "{\"error\":\"" + reply + "\"}\n";
+    [[maybe_unused]] ssize_t sent = ::send(fd, line.data(), line.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
+    ::close(fd);
+}
+
+void ControlServer::acceptWithoutDescriptors() {
+    // The reserve descriptor makes room for one: the waiting client learns why and is closed,
+    // so the listening socket stops being readable for it.
+    if (_reserveFd < 0) return;
+    ::close(_reserveFd);
+    _reserveFd = -1;
+    int fd = ::accept4(_listenFd, nullptr, nullptr, SOCK_NONBLOCK | SOCK_CLOEXEC);
+    if (fd >= 0) refuse(fd, "the daemon has no file descriptors left");
+    _reserveFd = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
 }
 
 void ControlServer::readFrom(Client& client) {

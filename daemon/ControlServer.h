@@ -5,6 +5,8 @@
 // line and leaves, or never reads its replies, costs a descriptor and a bounded buffer, and never
 // holds up the daemon. Lines longer than kMaxLineLength get an error reply.
 
+#include <sys/types.h>
+
 #include <cstddef>
 #include <functional>
 #include <map>
@@ -18,6 +20,9 @@ public:
     static constexpr std::size_t kMaxLineLength = 64 * 1024;
     // A client whose unread replies grow past this is disconnected.
     static constexpr std::size_t kMaxPendingOutput = 16 * 1024 * 1024;
+    // Clients beyond this many get a refusal line and are closed.
+    static constexpr std::size_t kMaxClients = 64;
+    static constexpr int kListenBacklog = 128;
 
     // Answers one request line (without its newline) with one reply line (without newline).
     using Handler = std::function<std::string(const std::string& line)>;
@@ -49,6 +54,8 @@ private:
     void writeTo(Client& client);
     void updateInterest(Client& client);
     void drop(int fd);
+    void refuse(int fd, const std::string& reply);
+    void acceptWithoutDescriptors();
 
     std::string _path;
     Handler _handler;
@@ -56,6 +63,10 @@ private:
     int _lockFd = -1;
     int _listenFd = -1;
     int _epollFd = -1;
+    // Kept open so that, with the descriptor table full, a waiting client can still be taken off
+    // the queue and told why: otherwise the listening socket stays readable and the loop spins.
+    int _reserveFd = -1;
+    ino_t _socketInode = 0;  // the socket file this server made, so that only it is removed
     std::map<int, std::unique_ptr<Client>> _clients;
 };
 

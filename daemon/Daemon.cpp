@@ -17,6 +17,7 @@
 #include "daemon/KeyLogOutput.h"
 #include "daemon/KeyMapper.h"
 #include "daemon/PluginInstance.h"
+#include "daemon/Signals.h"
 #include "daemon/PluginLibrary.h"
 #include "daemon/SimulationFeeder.h"
 #include "daemon/UinputKeyOutput.h"
@@ -81,10 +82,7 @@ Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
         _discovery = std::make_unique<DeviceDiscovery>(_options.vendor, _options.product);
     }
 
-    sigset_t signals;
-    sigemptyset(&signals);
-    sigaddset(&signals, SIGTERM);
-    sigaddset(&signals, SIGINT);
+    const sigset_t signals = daemonSignals();
     _signalFd = ::signalfd(-1, &signals, SFD_NONBLOCK | SFD_CLOEXEC);
     if (_signalFd < 0) throw systemError("cannot take signals through a signalfd");
     _timerFd = ::timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
@@ -267,7 +265,14 @@ void Daemon::handleSignal() {
     signalfd_siginfo info;
     bool stop = false;
     while (::read(_signalFd, &info, sizeof(info)) == static_cast<ssize_t>(sizeof(info))) {
-        _log.log("stopping on %s", info.ssi_signo == SIGINT ? "SIGINT" : "SIGTERM");
+        const int signal = static_cast<int>(info.ssi_signo);
+        const char* name = sigabbrev_np(signal);
+        if (signal == SIGHUP) {
+            // The daemon reads no configuration file yet; SIGHUP is acknowledged, not fatal.
+            _log.log("SIGHUP: nothing to read again");
+            continue;
+        }
+        _log.log("stopping on SIG%s", name ? name : "?");
         stop = true;
     }
     if (stop) beginShutdown();

@@ -1,5 +1,7 @@
 #include "daemon/SimulationFeeder.h"
 
+#include "platform/PropertyValueJson.h"
+
 #include <time.h>
 
 #include <algorithm>
@@ -70,6 +72,12 @@ private:
     bool handle(int depth, json::parse_event_t event, json& parsed) {
         using Event = json::parse_event_t;
         if (_unusual) return false;
+        // A value nested deeper than any document may be is not kept (writing it back out would
+        // recurse that deep); the whole-document reader then refuses the document with its message.
+        if (depth > static_cast<int>(PropertyValueJson::kMaxNestingDepth)) {
+            _unusual = true;
+            return false;
+        }
         if (depth == 0 && event == Event::array_start) _unusual = true;
         if (depth == 1) {
             bool framesKey = _key == "Frames" || _key == "Reports";

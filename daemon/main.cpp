@@ -11,6 +11,7 @@
 #include <string>
 
 #include "daemon/Daemon.h"
+#include "daemon/Signals.h"
 #include "platform/Log.h"
 
 #ifndef TOLKA_DEFAULT_PLUGIN_PATH
@@ -50,10 +51,7 @@ std::string parseUsbId(const std::string& text, uint16_t& id) {
 int main(int argc, char** argv) {
     // Before any thread exists, so that every thread inherits the mask and the signals reach
     // only the daemon's signalfd.
-    sigset_t signals;
-    sigemptyset(&signals);
-    sigaddset(&signals, SIGTERM);
-    sigaddset(&signals, SIGINT);
+    const sigset_t signals = TolkaTouch::daemonSignals();
     pthread_sigmask(SIG_BLOCK, &signals, nullptr);
     std::signal(SIGPIPE, SIG_IGN);
 

@@ -1,7 +1,9 @@
 #include "daemon/ControlServer.h"
 
 #include <gtest/gtest.h>
+#include <fcntl.h>
 #include <poll.h>
+#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
@@ -11,6 +13,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
+#include <fstream>
 #include <stdexcept>
 
 namespace TolkaTouch {
@@ -182,6 +185,71 @@ TEST_F(ControlServerTest, SocketHasMode0660AndGoesWithTheServer) {
     EXPECT_EQ(info.st_mode & 0777, 0660u);
     server.reset();
     EXPECT_FALSE(std::filesystem::exists(path));
+}
+
+TEST_F(ControlServerTest, ARegularFileAtTheSocketPathIsNeverDeleted) {
+    std::ofstream(path) << "notes";
+    try {
+        startServer();
+        FAIL() << "the server took the path";
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()), path + " exists and is not a socket; not replacing it");
+    }
+    std::ifstream kept(path);
+    std::string text;
+    kept >> text;
+    EXPECT_EQ(text, "notes");
+}
+
+TEST_F(ControlServerTest, ASocketSomethingElseListensOnIsLeftAlone) {
+    int other = ::socket(AF_UNIX, SOCK_STREAM, 0);
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    std::strcpy(address.sun_path, path.c_str());
+    ASSERT_EQ(::bind(other, reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
+    ASSERT_EQ(::listen(other, 1), 0);
+    EXPECT_THROW(startServer(), std::runtime_error);
+    EXPECT_TRUE(std::filesystem::exists(path));
+    ::close(other);
+}
+
+TEST_F(ControlServerTest, ASocketFileReplacedAfterStartIsNotRemovedByTheServer) {
+    startServer();
+    std::filesystem::remove(path);
+    std::ofstream(path) << "someone else's";
+    server.reset();
+    EXPECT_TRUE(std::filesystem::exists(path));
+}
+
+TEST_F(ControlServerTest, ClientsBeyondTheLimitAreToldAndClosed) {
+    startServer();
+    for (size_t i = 0; i < ControlServer::kMaxClients; ++i) connectClient();
+    serveFor(50);
+    EXPECT_EQ(server->clientCount(), ControlServer::kMaxClients);
+    int extra = connectClient();
+    EXPECT_EQ(receiveLines(extra, 1), "{\"error\":\"too many clients (at most 64)\"}\n");
+    EXPECT_EQ(server->clientCount(), ControlServer::kMaxClients);
+}
+
+TEST_F(ControlServerTest, WithTheDescriptorTableFullAWaitingClientIsRefusedAndTheLoopGoesQuiet) {
+    startServer();
+    int waiting = connectClient();
+    // Fill the table: every descriptor up to the limit is taken, the reserve aside.
+    rlimit limit{};
+    ASSERT_EQ(::getrlimit(RLIMIT_NOFILE, &limit), 0);
+    const rlimit saved = limit;
+    limit.rlim_cur = 256;
+    ASSERT_EQ(::setrlimit(RLIMIT_NOFILE, &limit), 0);
+    std::vector<int> fillers;
+    for (int fd = ::open("/dev/null", O_RDONLY); fd >= 0; fd = ::open("/dev/null", O_RDONLY)) fillers.push_back(fd);
+    serveFor(50);
+    std::string reply = receiveLines(waiting, 1);
+    for (int fd : fillers) ::close(fd);
+    ::setrlimit(RLIMIT_NOFILE, &saved);
+    EXPECT_EQ(reply, "{\"error\":\"the daemon has no file descriptors left\"}\n");
+    // Nothing is left waiting, so the socket is no longer ready: no busy loop.
+    pollfd ready{server->pollFd(), POLLIN, 0};
+    EXPECT_EQ(::poll(&ready, 1, 0), 0);
 }
 
 TEST_F(ControlServerTest, SocketPathTooLongIsRefused) {

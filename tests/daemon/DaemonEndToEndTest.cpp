@@ -234,6 +234,34 @@ TEST_F(DaemonEndToEndTest, SigintStopsTheDaemonToo) {
     EXPECT_EQ(daemon->wait(1000ms), 0);
 }
 
+TEST_F(DaemonEndToEndTest, EveryOtherTerminatingSignalStopsTheDaemonCleanlyWithTheKeyReleased) {
+    for (int signal : {SIGQUIT, SIGUSR1, SIGUSR2}) {
+        std::string keyLog = file("keys-" + std::to_string(signal) + ".log");
+        auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--key-log", keyLog});
+        auto deadline = std::chrono::steady_clock::now() + 20s;
+        while (Testing::readWholeFile(keyLog).find("KEY_VOLUMEUP 1") == std::string::npos &&
+               std::chrono::steady_clock::now() < deadline) {
+            std::this_thread::sleep_for(5ms);
+        }
+        daemon->signal(signal);
+        auto status = daemon->wait(1000ms);
+        ASSERT_TRUE(status) << "still running one second after signal " << signal;
+        EXPECT_EQ(*status, 0) << "signal " << signal;
+        EXPECT_EQ(lines(Testing::readWholeFile(keyLog)).back(), "KEY_VOLUMEUP 0") << "signal " << signal;
+        EXPECT_FALSE(std::filesystem::exists(socket)) << "signal " << signal;
+    }
+}
+
+TEST_F(DaemonEndToEndTest, SighupDoesNotStopTheDaemon) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    daemon->signal(SIGHUP);
+    EXPECT_FALSE(daemon->wait(300ms)) << "the daemon stopped on SIGHUP";
+    ::close(connectControl());  // still answering
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(1000ms), 0);
+}
+
 TEST_F(DaemonEndToEndTest, SecondDaemonOnTheSameSocketRefusesToStart) {
     std::string document = synthesize("long-hold.gestures");
     auto first = startDaemon(document, {"--no-keys"});

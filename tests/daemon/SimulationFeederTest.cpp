@@ -50,6 +50,20 @@ protected:
     bool finished = false;
 };
 
+TEST_F(SimulationFeederTest, AStateValueNestedAHundredThousandDeepIsRefusedWithoutRecursion) {
+    const std::string deep = std::string(100000, '[') + std::string(100000, ']');
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 03 "},
+        {"Type": "State", "Timestamp": 1500, "Key": "Algs.X", "Value": )" + deep + "}]}");
+    try {
+        SimulationFeeder feeder(path, 1.0f);
+        FAIL() << "the document was taken";
+    } catch (const std::runtime_error& error) {
+        EXPECT_EQ(std::string(error.what()),
+                  "the recording " + path + " cannot be played: migrateSerializedContainer failed: invalid container");
+    }
+}
+
 TEST_F(SimulationFeederTest, FramesGoOutInOrderThenFinishedIsCalled) {
     std::string path = write(R"({"Version": 1, "Frames": [
         {"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 03 "},
