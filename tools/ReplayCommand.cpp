@@ -43,6 +43,11 @@ void runReplay(const ReplayArguments& arguments) {
     ReplayOptions options;
     options.speed = arguments.speed;
     options.fast = arguments.fast;
+    options.onPauseCut = [](uint64_t microseconds) {
+        std::fflush(stdout);
+        std::fprintf(stderr, "tolkatouch: a pause of %.1f s in the recording is cut to %.0f s\n",
+                     static_cast<double>(microseconds) / 1e6, static_cast<double>(kMaxReplayPauseMicroseconds) / 1e6);
+    };
     for (const std::string& assignment : arguments.settings) {
         const CheckedSetting checked = checkSettingAssignment(assignment);
         options.settings.emplace_back(checked.setting->algsKey(), checked.value);
@@ -83,9 +88,10 @@ void addReplayCommand(CLI::App& app) {
                              ->check(CLI::Validator(
                                  [](std::string& text) {
                                      float value = 0.0f;
-                                     return CLI::detail::lexical_cast(text, value) && value > 0.0f
+                                     return CLI::detail::lexical_cast(text, value) && value >= kMinReplaySpeed &&
+                                                    value <= kMaxReplaySpeed
                                                 ? std::string()
-                                                : std::string("the speed must be a number above 0");
+                                                : std::string("the speed must be a number from 0.01 to 1000");
                                  },
                                  ""));
     command->add_flag("--fast", arguments->fast, "Deliver every frame at once, without pacing")->excludes(speed);

@@ -17,7 +17,14 @@ void Replayer::run(const ReplayOptions& options, const std::function<void(const 
     if (options.fast) {
         _recording.clock.sleepMicroseconds = [](uint64_t) {};
     } else {
-        _recording.clock.sleepMicroseconds = Host::sleepMicroseconds;
+        std::function<void(uint64_t)> sleep = options.sleep ? options.sleep : Host::sleepMicroseconds;
+        _recording.clock.sleepMicroseconds = [sleep, cut = options.onPauseCut](uint64_t microseconds) {
+            if (microseconds > kMaxReplayPauseMicroseconds) {
+                if (cut) cut(microseconds);
+                microseconds = kMaxReplayPauseMicroseconds;
+            }
+            sleep(microseconds);
+        };
     }
 
     _pipeline->hidEventsProbe = [&onEvent](const EventList& events) {

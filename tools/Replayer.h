@@ -18,10 +18,21 @@
 
 namespace TolkaTouch::Tools {
 
+// Speeds a paced replay takes: slower than a hundredth would turn seconds into hours, faster than
+// a thousand is what --fast is for.
+inline constexpr float kMinReplaySpeed = 0.01f;
+inline constexpr float kMaxReplaySpeed = 1000.0f;
+// The longest pause a paced replay makes: a longer gap in a recording (a device left idle, or a
+// broken time stamp) is cut to this.
+inline constexpr uint64_t kMaxReplayPauseMicroseconds = 10'000'000;
+
 struct ReplayOptions {
     float speed = 1.0f;
     bool fast = false;  // every frame at once, no sleeping
     std::vector<std::pair<std::string, PropertyValue>> settings;  // applied before the first frame
+    // How a paced replay waits, and who hears of a pause that was cut (the pause asked for).
+    std::function<void(uint64_t microseconds)> sleep;
+    std::function<void(uint64_t microseconds)> onPauseCut;
 };
 
 class Replayer {

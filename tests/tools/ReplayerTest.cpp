@@ -49,6 +49,41 @@ TEST(ReplayerTest, PacedReplaySleepsTheRecordedGapsDividedByTheSpeed) {
     EXPECT_EQ(events, 2);
 }
 
+TEST(ReplayerTest, APauseLongerThanTenSecondsIsCutAndReported) {
+    // Two reports 2^64 - 1 ns apart, as a broken time stamp gives: the replay must still end.
+    std::vector<uint8_t> document;
+    const std::string text = R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 0, "Report": "02 00 "},
+        {"Type": "InputReport", "Timestamp": 18446744073709551615, "Report": "02 00 "}]})";
+    document.assign(text.begin(), text.end());
+    Replayer replayer{PipelineRecording(&document)};
+    std::vector<uint64_t> slept;
+    std::vector<uint64_t> cut;
+    ReplayOptions options;
+    options.sleep = [&](uint64_t microseconds) { slept.push_back(microseconds); };
+    options.onPauseCut = [&](uint64_t microseconds) { cut.push_back(microseconds); };
+    replayer.run(options, [](const HIDEvent&) {});
+    EXPECT_EQ(slept, (std::vector<uint64_t>{kMaxReplayPauseMicroseconds}));
+    ASSERT_EQ(cut.size(), 1u);
+    EXPECT_EQ(cut[0], 18446744949882880u);  // the gap in single precision, in microseconds
+}
+
+TEST(ReplayerTest, APauseOfTenSecondsOrLessIsKept) {
+    std::vector<uint8_t> document;
+    const std::string text = R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 0, "Report": "02 00 "},
+        {"Type": "InputReport", "Timestamp": 8000000, "Report": "02 00 "}]})";
+    document.assign(text.begin(), text.end());
+    Replayer replayer{PipelineRecording(&document)};
+    std::vector<uint64_t> slept;
+    ReplayOptions options;
+    options.speed = 2.0f;
+    options.sleep = [&](uint64_t microseconds) { slept.push_back(microseconds); };
+    options.onPauseCut = [](uint64_t) { FAIL() << "a short pause was cut"; };
+    replayer.run(options, [](const HIDEvent&) {});
+    EXPECT_EQ(slept, (std::vector<uint64_t>{4000}));
+}
+
 TEST(ReplayerTest, EmptyRecordingPlaysNothing) {
     Replayer replayer{PipelineRecording()};
     int events = 0;

@@ -126,3 +126,6 @@ tolka_add_cli_test(ReplayWithASettingValueOfTheWrongTypeNamesTheRangeAndExitsTwo
 tolka_add_cli_test(ReplayTakesTheSettingInThePropertysKeyFormToo
   --stdout ${expected}/everyday-session.hold-timeout-1000.jsonl
   -- replay --fast --json --set Pipeline.Algs.HoldTimeoutMilliseconds=1000 ${examples}/everyday-session.json)
+tolka_add_cli_test(ReplayRefusesASpeedBelowAHundredth
+  --exit 2 --stdout-empty --stderr-contains "the speed must be a number from 0.01 to 1000"
+  -- replay --speed 1e-30 ${examples}/reset-during-hold.json)
