@@ -8,6 +8,7 @@
 #include <fmt/format.h>
 
 #include "algs/Algs.h"
+#include "common/NearestWord.h"
 
 namespace TolkaTouch {
 
@@ -55,22 +56,6 @@ std::pair<std::string_view, std::string_view> splitKey(std::string_view key) {
         if (key.substr(0, prefix.size()) == prefix) return {prefix, key.substr(prefix.size())};
     }
     return {std::string_view(), key};
-}
-
-size_t editDistance(std::string_view a, std::string_view b) {
-    std::vector<size_t> row(b.size() + 1);
-    for (size_t j = 0; j <= b.size(); ++j) row[j] = j;
-    for (size_t i = 1; i <= a.size(); ++i) {
-        size_t diagonal = row[0];
-        row[0] = i;
-        for (size_t j = 1; j <= b.size(); ++j) {
-            const size_t above = row[j];
-            const size_t substitution = diagonal + (a[i - 1] == b[j - 1] ? 0 : 1);
-            row[j] = std::min({above + 1, row[j - 1] + 1, substitution});
-            diagonal = above;
-        }
-    }
-    return row[b.size()];
 }
 
 // Text from outside, shown in a message: control characters are escaped so that they cannot
@@ -155,16 +140,9 @@ bool isSettingKeyForm(std::string_view key) {
 
 std::string nearestSettingKey(std::string_view key) {
     const auto [prefix, bare] = splitKey(key);
-    const Setting* nearest = nullptr;
-    size_t best = SIZE_MAX;
-    for (const Setting& setting : settingsTable()) {
-        const size_t distance = editDistance(bare, setting.key);
-        if (distance < best) {
-            best = distance;
-            nearest = &setting;
-        }
-    }
-    return std::string(prefix) + nearest->key;
+    std::vector<std::string> keys;
+    for (const Setting& setting : settingsTable()) keys.push_back(setting.key);
+    return std::string(prefix) + nearestWord(bare, keys);
 }
 
 std::string acceptedValues(const Setting& setting) {

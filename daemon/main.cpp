@@ -8,14 +8,19 @@
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
 #include <string>
 
 #include "daemon/Daemon.h"
 #include "daemon/Signals.h"
 #include "platform/Log.h"
+#include "tolkatouch/VersionText.h"
 
 #ifndef TOLKA_DEFAULT_PLUGIN_PATH
 #define TOLKA_DEFAULT_PLUGIN_PATH "/usr/local/lib/tolkatouch/tolkatouch-hidservice.so"
+#endif
+#ifndef TOLKA_PLUGIN_INSTALL_SUBDIR
+#define TOLKA_PLUGIN_INSTALL_SUBDIR "lib/tolkatouch"
 #endif
 
 namespace {
@@ -46,6 +51,24 @@ std::string parseUsbId(const std::string& text, uint16_t& id) {
     return {};
 }
 
+// The plug-in beside this program first: in the build tree (daemon/ and plugin/ side by side),
+// or in a prefix unpacked anywhere (sbin/ beside lib/tolkatouch/); then where it was installed.
+std::string defaultPluginPath() {
+    namespace fs = std::filesystem;
+    std::error_code error;
+    const fs::path program = fs::read_symlink("/proc/self/exe", error);
+    if (!error) {
+        const fs::path here = program.parent_path();
+        for (const fs::path& candidate :
+             {here / "tolkatouch-hidservice.so", here / ".." / "plugin" / "tolkatouch-hidservice.so",
+              here / ".." / "lib" / "tolkatouch" / "tolkatouch-hidservice.so",
+              here / ".." / TOLKA_PLUGIN_INSTALL_SUBDIR / "tolkatouch-hidservice.so"}) {
+            if (fs::exists(candidate, error)) return candidate.lexically_normal().string();
+        }
+    }
+    return TOLKA_DEFAULT_PLUGIN_PATH;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -56,7 +79,6 @@ int main(int argc, char** argv) {
     std::signal(SIGPIPE, SIG_IGN);
 
     TolkaTouch::DaemonOptions options;
-    options.pluginPath = TOLKA_DEFAULT_PLUGIN_PATH;
     options.socketPath = defaultSocketPath();
     std::string vendor = hexId(TolkaTouch::SurfaceIds::kDefaultVendorId);
     std::string product = hexId(TolkaTouch::SurfaceIds::kDefaultProductId);
@@ -71,9 +93,16 @@ int main(int argc, char** argv) {
     app.add_option("--product", product, "USB product ID of the surface, hexadecimal")
         ->type_name("HEX")
         ->capture_default_str();
-    app.add_option("--plugin", options.pluginPath, "the HID service plug-in library")
-        ->type_name("PATH")
-        ->capture_default_str();
+    bool pluginGiven = false;
+    app.add_option_function<std::string>(
+           "--plugin",
+           [&](const std::string& path) {
+               options.pluginPath = path;
+               pluginGiven = true;
+           },
+           "the HID service plug-in library (default: the one beside this program, in a build tree or "
+           "an unpacked package, else " TOLKA_DEFAULT_PLUGIN_PATH ")")
+        ->type_name("PATH");
     app.add_option("--socket", options.socketPath, "the control socket")->type_name("PATH")->capture_default_str();
     app.add_flag("--print", options.print,
                  "print each event as a JSON line on standard output; keys are still written when the "
@@ -92,7 +121,15 @@ int main(int argc, char** argv) {
         ->capture_default_str()
         ->check(CLI::PositiveNumber);
     app.add_flag("--debug", debug, "log at debug level");
-    CLI11_PARSE(app, argc, argv);
+    app.set_version_flag("--version", TolkaTouch::versionText("tolkatouchd"), "Print the version and exit");
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        // Help and version are answers; anything else the parser refuses is a usage error (2).
+        const int answered = app.exit(error);
+        return answered == static_cast<int>(CLI::ExitCodes::Success) ? 0 : 2;
+    }
+    if (!pluginGiven) options.pluginPath = defaultPluginPath();
 
     if (auto error = parseUsbId(vendor, options.vendor); !error.empty()) {
         std::fprintf(stderr, "tolkatouchd: --vendor: %s\n", error.c_str());

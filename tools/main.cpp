@@ -1,13 +1,19 @@
 // tolkatouch: the touch surface's command-line tool. One program with a subcommand per job;
 // every subcommand has --help.
 
+#include <algorithm>
+#include <cstdint>
 #include <cstdio>
 #include <exception>
+#include <string>
+#include <vector>
 
 #include <CLI/CLI.hpp>
 
 #include "tools/Commands.h"
+#include "common/NearestWord.h"
 #include "tolkatouch/Settings.h"
+#include "tolkatouch/VersionText.h"
 #include "tools/DocumentFile.h"
 
 namespace {
@@ -22,6 +28,7 @@ int main(int argc, char** argv) {
 
     CLI::App app{"Replays, synthesises, shows and converts the touch surface's recordings.", "tolkatouch"};
     app.require_subcommand(1);
+    app.set_version_flag("--version", TolkaTouch::versionText("tolkatouch"), "Print the version and exit");
     app.failure_message(CLI::FailureMessage::help);
 
     addReplayCommand(app);
@@ -32,6 +39,17 @@ int main(int argc, char** argv) {
     addKeysCommand(app);
     addPropCommand(app);
     addDevicesCommand(app);
+
+    // A first word that names no subcommand is a typo far more often than anything else.
+    if (argc > 1 && argv[1][0] != '-') {
+        std::vector<std::string> names;
+        for (const CLI::App* command : app.get_subcommands({})) names.push_back(command->get_name());
+        if (std::find(names.begin(), names.end(), argv[1]) == names.end()) {
+            std::fprintf(stderr, "tolkatouch: unknown subcommand \"%s\" (did you mean \"%s\"?)\n",
+                         argv[1], TolkaTouch::nearestWord(argv[1], names).c_str());
+            return kExitUsage;
+        }
+    }
 
     try {
         app.parse(argc, argv);

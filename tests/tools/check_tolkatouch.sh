@@ -1,7 +1,7 @@
 #!/bin/bash
 # Runs one tolkatouch command and checks what it did:
 #   check_tolkatouch.sh [--exit N] [--stdout FILE | --stdout-empty] [--stderr-text TEXT | --stderr-empty]
-#                       [--stderr-contains TEXT] [--stdin FILE] -- COMMAND [ARGUMENTS...]
+#                       [--stderr-contains TEXT] [--stdout-contains TEXT] [--stdin FILE] -- COMMAND [ARGUMENTS...]
 # --stdout FILE compares standard output with FILE byte for byte; --stderr-text compares standard
 # error with TEXT and one line end. The exit status defaults to 0. On a difference it prints the
 # diff and fails.
@@ -14,6 +14,7 @@ stderr_text=
 stderr_text_given=0
 stderr_empty=0
 stderr_contains=
+stdout_contains=
 stdin_file=/dev/null
 
 while [ $# -gt 0 ]; do
@@ -24,6 +25,7 @@ while [ $# -gt 0 ]; do
     --stderr-text) stderr_text=$2; stderr_text_given=1; shift 2 ;;
     --stderr-empty) stderr_empty=1; shift ;;
     --stderr-contains) stderr_contains=$2; shift 2 ;;
+    --stdout-contains) stdout_contains=$2; shift 2 ;;
     --stdin) stdin_file=$2; shift 2 ;;
     --) shift; break ;;
     *) echo "check_tolkatouch.sh: unknown option $1" >&2; exit 2 ;;
@@ -67,6 +69,11 @@ fi
 if [ -n "$stderr_contains" ] && ! grep -qF -- "$stderr_contains" "$work/stderr"; then
   echo "standard error lacks '$stderr_contains':"
   head -20 "$work/stderr"
+  failed=1
+fi
+if [ -n "$stdout_contains" ] && ! grep -qF -- "$stdout_contains" "$work/stdout"; then
+  echo "standard output lacks '$stdout_contains':"
+  head -20 "$work/stdout"
   failed=1
 fi
 exit $failed

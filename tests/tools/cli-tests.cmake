@@ -129,3 +129,9 @@ tolka_add_cli_test(ReplayTakesTheSettingInThePropertysKeyFormToo
 tolka_add_cli_test(ReplayRefusesASpeedBelowAHundredth
   --exit 2 --stdout-empty --stderr-contains "the speed must be a number from 0.01 to 1000"
   -- replay --speed 1e-30 ${examples}/reset-during-hold.json)
+tolka_add_cli_test(AMistypedSubcommandIsNamedWithTheNearestOne
+  --exit 2 --stdout-empty
+  --stderr-text "tolkatouch: unknown subcommand \"reply\" (did you mean \"replay\"?)"
+  -- reply --fast)
+tolka_add_cli_test(VersionPrintsTheProgramAndItsVersion
+  --stderr-empty --stdout-contains "tolkatouch ${PROJECT_VERSION}" -- --version)
