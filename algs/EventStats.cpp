@@ -7,11 +7,25 @@ namespace TolkaTouch {
 
 void EventStats::Reset() { *this = EventStats(); }
 
+namespace {
+
+// Adds one to the counter of the region, where the region has one: play/pause (1), volume down
+// (2), volume up (3).
+void countIn(PixelRegion region, uint64_t* playPause, uint64_t* volumeDown, uint64_t* volumeUp) {
+    uint64_t* counter = nullptr;
+    switch (region) {
+    case PixelRegion::PlayPause: counter = playPause; break;
+    case PixelRegion::VolumeDown: counter = volumeDown; break;
+    case PixelRegion::VolumeUp: counter = volumeUp; break;
+    case PixelRegion::None: break;
+    }
+    if (counter != nullptr) ++*counter;
+}
+
+}  // namespace
+
 void EventStats::update(const FrameVerdict& verdict) {
     const PixelRegion r = verdict.region;
-    constexpr PixelRegion kRegion1 = PixelRegion::PlayPause;
-    constexpr PixelRegion kRegion2 = PixelRegion::VolumeDown;
-    constexpr PixelRegion kRegion3 = PixelRegion::VolumeUp;
     const Transition t = verdict.transition;
     const bool heldBefore = t == Transition::Holding || t == Transition::HoldMoved || t == Transition::HoldEnded;
 
@@ -24,20 +38,15 @@ void EventStats::update(const FrameVerdict& verdict) {
         switch (verdict.holdClock) {
         case HoldClock::Before:
         case HoldClock::Dropped:
-            if (r == kRegion2) ++numRejectedVolumeDecrement;
-            if (r == kRegion3) ++numRejectedVolumeIncrement;
+            countIn(r, nullptr, &numRejectedVolumeDecrement, &numRejectedVolumeIncrement);
             break;
         case HoldClock::Past:
             ++numRejectedIncrementHold;
-            if (r == kRegion2) ++numRejectedVolumeDecrement;
-            if (r == kRegion1) ++numRejectedKalioCallIncrement;
-            if (r == kRegion3) ++numRejectedVolumeIncrement;
+            countIn(r, &numRejectedKalioCallIncrement, &numRejectedVolumeDecrement, &numRejectedVolumeIncrement);
             break;
         case HoldClock::Reached:
             ++numRejectedBeginHold;
-            if (r == kRegion2) ++numRejectedVolumeDecrement;
-            if (r == kRegion1) ++numRejectedKalioCall;
-            if (r == kRegion3) ++numRejectedVolumeIncrement;
+            countIn(r, &numRejectedKalioCall, &numRejectedVolumeDecrement, &numRejectedVolumeIncrement);
             break;
         }
         return;
@@ -50,16 +59,12 @@ void EventStats::update(const FrameVerdict& verdict) {
     case Transition::HoldBegan:
         // 2. A hold, counted every frame it lasts.
         ++numBeginHold;
-        if (r == kRegion1) ++numKalioCall;
-        if (r == kRegion2) ++numVolumeDecrement;
-        if (r == kRegion3) ++numVolumeIncrement;
+        countIn(r, &numKalioCall, &numVolumeDecrement, &numVolumeIncrement);
         return;
     case Transition::Holding:
     case Transition::HoldMoved:
         ++numIncrementHold;
-        if (r == kRegion1) ++numKalioCallIncrement;
-        if (r == kRegion2) ++numVolumeDecrement;
-        if (r == kRegion3) ++numVolumeIncrement;
+        countIn(r, &numKalioCallIncrement, &numVolumeDecrement, &numVolumeIncrement);
         return;
     case Transition::HoldEnded:
         // 3. The hold ended.
@@ -75,15 +80,11 @@ void EventStats::update(const FrameVerdict& verdict) {
     } else if (t == Transition::TapAccepted) {
         // ... or a tap stands ...
         ++numTaps;
-        if (r == kRegion1) ++numPlayPause;
-        if (r == kRegion2) ++numVolumeDown;
-        if (r == kRegion3) ++numVolumeUp;
+        countIn(r, &numPlayPause, &numVolumeDown, &numVolumeUp);
     } else if (t == Transition::TapRejected) {
         // ... or was rejected.
         ++numRejectedTap;
-        if (r == kRegion1) ++numRejectedPlayPause;
-        if (r == kRegion2) ++numRejectedVolumeDown;
-        if (r == kRegion3) ++numRejectedVolumeUp;
+        countIn(r, &numRejectedPlayPause, &numRejectedVolumeDown, &numRejectedVolumeUp);
     }
 }
 

@@ -72,6 +72,18 @@ protected:
         return text;
     }
 
+    // A socket file at the path, as another program leaves or serves it.
+    int bindSocketAtPath() {
+        int fd = ::socket(AF_UNIX, SOCK_STREAM, 0);
+        sockaddr_un address{};
+        address.sun_family = AF_UNIX;
+        std::strcpy(address.sun_path, path.c_str());
+        if (::bind(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
+            throw std::runtime_error("bind failed");
+        }
+        return fd;
+    }
+
     void serveFor(int milliseconds) {
         pollfd ready{server->pollFd(), POLLIN, 0};
         if (::poll(&ready, 1, milliseconds) > 0) server->handleReady();
@@ -165,12 +177,7 @@ TEST_F(ControlServerTest, SecondServerOnTheSameSocketRefusesWithAClearMessage) {
 }
 
 TEST_F(ControlServerTest, StaleSocketFileOfAGoneDaemonIsReplaced) {
-    int stale = ::socket(AF_UNIX, SOCK_STREAM, 0);
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::strcpy(address.sun_path, path.c_str());
-    ASSERT_EQ(::bind(stale, reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
-    ::close(stale);
+    ::close(bindSocketAtPath());
     startServer();
     int client = connectClient();
     send(client, "fresh\n");
@@ -202,11 +209,7 @@ TEST_F(ControlServerTest, ARegularFileAtTheSocketPathIsNeverDeleted) {
 }
 
 TEST_F(ControlServerTest, ASocketSomethingElseListensOnIsLeftAlone) {
-    int other = ::socket(AF_UNIX, SOCK_STREAM, 0);
-    sockaddr_un address{};
-    address.sun_family = AF_UNIX;
-    std::strcpy(address.sun_path, path.c_str());
-    ASSERT_EQ(::bind(other, reinterpret_cast<sockaddr*>(&address), sizeof(address)), 0);
+    int other = bindSocketAtPath();
     ASSERT_EQ(::listen(other, 1), 0);
     EXPECT_THROW(startServer(), std::runtime_error);
     EXPECT_TRUE(std::filesystem::exists(path));
