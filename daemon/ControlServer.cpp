@@ -2,6 +2,7 @@
 
 #include <fcntl.h>
 #include <sys/epoll.h>
+#include <sys/eventfd.h>
 #include <sys/file.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
@@ -17,6 +18,7 @@ namespace TolkaTouch {
 
 struct ControlServer::Client {
     int fd = -1;
+    std::string received;     // bytes read and not yet looked at
     std::string input;        // bytes of the line being read
     bool discarding = false;  // inside an oversized line: drop bytes up to its newline
     std::string output;       // replies not yet written
@@ -81,8 +83,9 @@ ControlServer::ControlServer(std::string path, Handler handler, OversizeReply ov
 
     auto fail = [this](const std::string& what) {
         auto error = systemError(what);
-        if (_listenFd >= 0) ::close(_listenFd);
-        if (_epollFd >= 0) ::close(_epollFd);
+        for (int fd : {_listenFd, _epollFd, _wakeFd, _reserveFd}) {
+            if (fd >= 0) ::close(fd);
+        }
         ::close(_lockFd);
         return error;
     };
@@ -105,6 +108,11 @@ ControlServer::ControlServer(std::string path, Handler handler, OversizeReply ov
     if (::epoll_ctl(_epollFd, EPOLL_CTL_ADD, _listenFd, &event) != 0) {
         throw fail("cannot watch the control socket");
     }
+    _wakeFd = ::eventfd(0, EFD_NONBLOCK | EFD_CLOEXEC);
+    event.data.fd = _wakeFd;
+    if (_wakeFd < 0 || ::epoll_ctl(_epollFd, EPOLL_CTL_ADD, _wakeFd, &event) != 0) {
+        throw fail("cannot make the control socket's wake-up");
+    }
 }
 
 ControlServer::~ControlServer() {
@@ -112,6 +120,7 @@ ControlServer::~ControlServer() {
     _clients.clear();
     ::close(_epollFd);
     ::close(_listenFd);
+    ::close(_wakeFd);
     if (_reserveFd >= 0) ::close(_reserveFd);
     // Only the socket this server made: the path may have been given to something else since.
     struct stat now {};
@@ -128,6 +137,10 @@ void ControlServer::handleReady() {
         int fd = events[i].data.fd;
         if (fd == _listenFd) {
             accept();
+            continue;
+        }
+        if (fd == _wakeFd) {
+            servePending();
             continue;
         }
         auto it = _clients.find(fd);
@@ -183,47 +196,84 @@ void ControlServer::acceptWithoutDescriptors() {
 }
 
 void ControlServer::readFrom(Client& client) {
-    char buffer[16 * 1024];
-    for (;;) {
-        ssize_t got = ::recv(client.fd, buffer, sizeof(buffer), 0);
-        if (got < 0 && errno == EINTR) continue;
-        if (got < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) break;
-        if (got <= 0) {
-            // The peer is done (or broken): a half line it leaves behind is dropped unanswered.
+    // One read a turn, and only while the bytes already taken are few: a client that floods the
+    // socket waits for its own replies, not the others for theirs.
+    if (!client.closing && client.received.size() < kMaxLineLength) {
+        char buffer[16 * 1024];
+        ssize_t got;
+        do {
+            got = ::recv(client.fd, buffer, sizeof(buffer), 0);
+        } while (got < 0 && errno == EINTR);
+        if (got > 0) {
+            client.received.append(buffer, static_cast<size_t>(got));
+        } else if (got == 0 || (errno != EAGAIN && errno != EWOULDBLOCK)) {
+            // The peer is done (or broken): its complete lines are still answered, a half line
+            // it leaves behind is dropped unanswered.
             client.closing = true;
-            client.input.clear();
-            break;
         }
-        for (ssize_t i = 0; i < got; ++i) {
-            char c = buffer[i];
-            if (c == '\n') {
-                if (client.discarding) {
-                    client.discarding = false;
-                } else {
-                    client.output += _handler(client.input);
-                    client.output += '\n';
-                }
+    }
+    serve(client);
+}
+
+void ControlServer::serve(Client& client) {
+    size_t budget = kLinesPerTurn;
+    size_t at = 0;
+    for (; at < client.received.size() && budget > 0; ++at) {
+        const char c = client.received[at];
+        if (c == '\n') {
+            if (client.discarding) {
+                client.discarding = false;
+            } else {
+                client.output += _handler(client.input);
+                client.output += '\n';
+                --budget;
+            }
+            client.input.clear();
+        } else if (!client.discarding) {
+            client.input += c;
+            if (client.input.size() > kMaxLineLength) {
+                client.output += _oversizeReply();
+                client.output += '\n';
                 client.input.clear();
-            } else if (!client.discarding) {
-                client.input += c;
-                if (client.input.size() > kMaxLineLength) {
-                    client.output += _oversizeReply();
-                    client.output += '\n';
-                    client.input.clear();
-                    client.discarding = true;
-                }
+                client.discarding = true;
+                --budget;
             }
         }
-        if (client.output.size() - client.outputOffset > kMaxPendingOutput) break;
     }
-    int fd = client.fd;
+    client.received.erase(0, at);
+    if (client.closing && client.received.empty()) client.input.clear();
+
+    // What is left waits for the next turn; the wake-up keeps the loop coming back for it.
+    if (!client.received.empty()) {
+        _pending.insert(client.fd);
+        const uint64_t one = 1;
+        [[maybe_unused]] ssize_t written = ::write(_wakeFd, &one, sizeof(one));
+    } else {
+        _pending.erase(client.fd);
+    }
+
+    const int fd = client.fd;
     writeTo(client);
     if (!_clients.count(fd)) return;
-    if (client.closing && client.output.empty()) {
+    if (client.closing && client.output.empty() && client.received.empty()) {
         drop(fd);
         return;
     }
     updateInterest(client);
+}
+
+void ControlServer::servePending() {
+    uint64_t count;
+    [[maybe_unused]] ssize_t got = ::read(_wakeFd, &count, sizeof(count));
+    const std::set<int> waiting = _pending;
+    for (int fd : waiting) {
+        auto it = _clients.find(fd);
+        if (it == _clients.end()) {
+            _pending.erase(fd);
+            continue;
+        }
+        serve(*it->second);
+    }
 }
 
 void ControlServer::writeTo(Client& client) {
@@ -245,7 +295,7 @@ void ControlServer::writeTo(Client& client) {
         drop(client.fd);  // it asks and never reads: the daemon will not keep its replies forever
         return;
     }
-    if (client.closing && client.output.empty()) {
+    if (client.closing && client.output.empty() && client.received.empty()) {
         drop(client.fd);
         return;
     }
@@ -264,6 +314,7 @@ void ControlServer::updateInterest(Client& client) {
 }
 
 void ControlServer::drop(int fd) {
+    _pending.erase(fd);
     ::epoll_ctl(_epollFd, EPOLL_CTL_DEL, fd, nullptr);
     ::close(fd);
     _clients.erase(fd);

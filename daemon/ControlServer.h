@@ -11,6 +11,7 @@
 #include <functional>
 #include <map>
 #include <memory>
+#include <set>
 #include <string>
 
 namespace TolkaTouch {
@@ -23,6 +24,8 @@ public:
     // Clients beyond this many get a refusal line and are closed.
     static constexpr std::size_t kMaxClients = 64;
     static constexpr int kListenBacklog = 128;
+    // Requests answered for one client before the others get their turn.
+    static constexpr std::size_t kLinesPerTurn = 8;
 
     // Answers one request line (without its newline) with one reply line (without newline).
     using Handler = std::function<std::string(const std::string& line)>;
@@ -51,6 +54,8 @@ private:
     struct Client;
     void accept();
     void readFrom(Client& client);
+    void serve(Client& client);
+    void servePending();
     void writeTo(Client& client);
     void updateInterest(Client& client);
     void drop(int fd);
@@ -66,6 +71,10 @@ private:
     // Kept open so that, with the descriptor table full, a waiting client can still be taken off
     // the queue and told why: otherwise the listening socket stays readable and the loop spins.
     int _reserveFd = -1;
+    // Clients with requests read and not yet answered, and the descriptor that keeps the loop
+    // coming back for them.
+    std::set<int> _pending;
+    int _wakeFd = -1;
     ino_t _socketInode = 0;  // the socket file this server made, so that only it is removed
     std::map<int, std::unique_ptr<Client>> _clients;
 };

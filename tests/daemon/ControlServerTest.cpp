@@ -9,6 +9,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
 #include <cstring>
@@ -253,6 +254,26 @@ TEST_F(ControlServerTest, WithTheDescriptorTableFullAWaitingClientIsRefusedAndTh
     // Nothing is left waiting, so the socket is no longer ready: no busy loop.
     pollfd ready{server->pollFd(), POLLIN, 0};
     EXPECT_EQ(::poll(&ready, 1, 0), 0);
+}
+
+TEST_F(ControlServerTest, AFloodingClientCannotHoldUpAQuietOne) {
+    startServer();
+    int flooder = connectClient();
+    int quiet = connectClient();
+    std::string flood;
+    for (int i = 0; i < 1000; ++i) flood += "f\n";
+    send(flooder, flood);
+    serveFor(50);  // the flooder is taken first, for one turn
+    send(quiet, "q\n");
+    // The quiet client is answered after at most one more turn of the flooder's.
+    const std::string reply = receiveLines(quiet, 1);
+    EXPECT_EQ(reply, "reply:q\n");
+    const auto answeredFlood = std::count(handled.begin(), handled.end(), "f");
+    EXPECT_LE(answeredFlood, static_cast<long>(3 * ControlServer::kLinesPerTurn));
+    // ... and the flooder still gets every one of its replies in the end.
+    EXPECT_EQ(std::count(handled.begin(), handled.end(), "q"), 1);
+    std::string floodReplies = receiveLines(flooder, 1000);
+    EXPECT_EQ(std::count(floodReplies.begin(), floodReplies.end(), '\n'), 1000);
 }
 
 TEST_F(ControlServerTest, SocketPathTooLongIsRefused) {
