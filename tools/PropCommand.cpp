@@ -1,12 +1,16 @@
 // tolkatouch prop get KEY / prop set KEY VALUE: reads and writes a property of the service that
 // tolkatouchd runs for a surface, through the daemon's control socket.
 
+#include <algorithm>
+#include <array>
 #include <cstdio>
 #include <memory>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include <CLI/CLI.hpp>
+#include <fmt/format.h>
 
 #include "platform/PropertyValueJson.h"
 #include "tools/Commands.h"
@@ -63,6 +67,44 @@ void runSet(const PropArguments& arguments) {
     if (reply.value("ok", false) != true) throw ToolError(arguments.key, "the service did not take the value");
 }
 
+const char* typeName(SettingType type) {
+    switch (type) {
+    case SettingType::Boolean: return "boolean";
+    case SettingType::Milliseconds: return "milliseconds";
+    case SettingType::Float: return "number";
+    case SettingType::Action: return "action";
+    }
+    return "";
+}
+
+// Every setting of the table with its type, the running service's value and the default.
+void runList(const PropArguments& arguments) {
+    std::vector<std::array<std::string, 4>> rows{{"setting", "type", "value", "default"}};
+    for (const Setting& setting : settingsTable()) {
+        std::string value = "-";
+        if (setting.tunable()) {
+            const auto reply = controlRequest(arguments.socket, withDevice({{"get", setting.propertyKey()}}, arguments.device),
+                                              setting.propertyKey());
+            const nlohmann::json current = reply.value("value", nlohmann::json());
+            // A single-precision setting is shown as the service holds it, not widened.
+            value = setting.type == SettingType::Float && current.is_number()
+                        ? fmt::format("{}", current.get<float>())
+                        : current.dump();
+        }
+        rows.push_back({setting.propertyKey(), typeName(setting.type), value, defaultText(setting)});
+    }
+    std::array<size_t, 4> widths{};
+    for (const auto& row : rows) {
+        for (size_t i = 0; i < row.size(); ++i) widths[i] = std::max(widths[i], row[i].size());
+    }
+    for (const auto& row : rows) {
+        std::string line = fmt::format("{:<{}}  {:<{}}  {:>{}}  {:>{}}", row[0], widths[0], row[1], widths[1], row[2],
+                                       widths[2], row[3], widths[3]);
+        std::puts(line.c_str());
+    }
+    std::fflush(stdout);
+}
+
 void addSocketAndDevice(CLI::App* command, PropArguments& arguments) {
     command->add_option("--socket", arguments.socket, "tolkatouchd's control socket")->capture_default_str();
     command->add_option("--device", arguments.device,
@@ -91,6 +133,11 @@ void addPropCommand(CLI::App& app) {
         ->required();
     addSocketAndDevice(set, *arguments);
     set->callback([arguments] { runSet(*arguments); });
+
+    CLI::App* list = prop->add_subcommand(
+        "list", "List every setting the running service takes, with its type, current value and default.");
+    addSocketAndDevice(list, *arguments);
+    list->callback([arguments] { runList(*arguments); });
 }
 
 }  // namespace TolkaTouch::Tools

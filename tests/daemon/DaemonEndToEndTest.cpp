@@ -16,6 +16,7 @@
 #include <vector>
 
 #include "tests/daemon/Subprocess.h"
+#include "tolkatouch/Settings.h"
 
 namespace TolkaTouch {
 namespace {
@@ -191,6 +192,25 @@ TEST_F(DaemonEndToEndTest, PropertiesCanBeReadAndWrittenWhileReportsFlow) {
                                        file("replay.out"), file("replay.err"));
     EXPECT_EQ(replayStatus, 0) << Testing::readWholeFile(file("replay.err"));
 
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, PropListShowsEverySettingAndPropSetRefusesAMisspeltOne) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    std::string out, err;
+    ASSERT_EQ(tool({"prop", "set", "HoldTimeoutMilliseconds", "700"}, &out, &err), 0) << err;
+    ASSERT_EQ(tool({"prop", "list"}, &out, &err), 0) << err;
+    const auto rows = lines(out);
+    ASSERT_EQ(rows.size(), 1 + settingsTable().size());
+    EXPECT_EQ(rows[0], "setting                                       type           value  default");
+    EXPECT_EQ(rows[2], "Pipeline.Algs.HoldTimeoutMilliseconds         milliseconds     700      500");
+    EXPECT_EQ(rows[5], "Pipeline.Algs.VirtualNormalizationFactors.0   number        0.6667   0.6667");
+
+    EXPECT_EQ(tool({"prop", "set", "Pipeline.Algs.HoldTimeoutMiliseconds", "700"}, &out, &err), 2);
+    EXPECT_EQ(err, "tolkatouch: unknown setting \"Pipeline.Algs.HoldTimeoutMiliseconds\" (did you mean "
+                   "\"Pipeline.Algs.HoldTimeoutMilliseconds\"?)\n");
     daemon->signal(SIGTERM);
     EXPECT_EQ(daemon->wait(10s), 0);
 }
