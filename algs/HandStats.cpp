@@ -36,14 +36,6 @@ bool precedes(const Pixel& a, const Pixel& b) {
 
 }  // namespace
 
-std::vector<Pixel> sortByMaxNormalizedAboveNoise(std::vector<Pixel> pixels) {
-    std::sort(pixels.begin(), pixels.end(), precedes);
-    return pixels;
-}
-
-namespace {
-
-// The first two of the region sort, found in one pass instead of sorting a copy every frame.
 std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels) {
     if (pixels.size() < 2) throw std::out_of_range("vector");
     const Pixel* first = &pixels[0];
@@ -60,8 +52,6 @@ std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::spa
     }
     return {first, second};
 }
-
-}  // namespace
 
 HandStats::HandStats() = default;
 

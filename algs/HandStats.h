@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <span>
+#include <utility>
 #include <vector>
 
 #include "algs/Pixel.h"
@@ -15,8 +16,10 @@
 
 namespace TolkaTouch {
 
-// The pixels largest maxNormalizedAboveNoise first; equal keys in ascending index order.
-std::vector<Pixel> sortByMaxNormalizedAboveNoise(std::vector<Pixel> pixels);
+// The first two pixels in the region rule's order: largest maxNormalizedAboveNoise first, equal
+// keys in ascending index order (a key that is not a number last). Found in one pass, without
+// sorting a copy. Throws std::out_of_range("vector") for fewer than two pixels.
+std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels);
 
 class HandStats {
 public:

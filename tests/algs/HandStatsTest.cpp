@@ -2,6 +2,9 @@
 
 #include <gtest/gtest.h>
 
+#include <limits>
+#include <stdexcept>
+
 #include <cmath>
 
 namespace TolkaTouch {
@@ -430,35 +433,44 @@ TEST(HandStatsTest, TwentyOneNonActivePixelsGiveActivePixelCountZero) {
     EXPECT_FALSE(hand.isTapRejected);
 }
 
-TEST(HandStatsTest, SortingPixelsWhoseKeysAreAllZeroLeavesThemInIndexOrder) {
-    const std::vector<Pixel> sorted = sortByMaxNormalizedAboveNoise(kIdle.pixels);
-    ASSERT_EQ(sorted.size(), 15u);
-    EXPECT_EQ(sorted[0].index, 0);  // "A"
-    EXPECT_EQ(sorted[1].index, 1);  // "B"
-    for (int i = 0; i < 15; ++i) EXPECT_EQ(sorted[static_cast<size_t>(i)].index, i);
+std::pair<int, int> twoFirstIndices(std::span<const Pixel> pixels) {
+    const auto [first, second] = twoFirstByMaxNormalizedAboveNoise(pixels);
+    return {first->index, second->index};
 }
 
-TEST(HandStatsTest, SortingPutsTheLargestKeyFirstAndKeepsEqualKeysInIndexOrder) {
+TEST(HandStatsTest, PixelsWhoseKeysAreAllZeroComeInIndexOrder) {
+    EXPECT_EQ(twoFirstIndices(kIdle.pixels), std::make_pair(0, 1));  // "A", "B"
+}
+
+TEST(HandStatsTest, TheLargestKeyComesFirstAndEqualKeysKeepIndexOrder) {
     HandFrame frame;
     frame.pixels[9].maxNormalizedAboveNoise = 2.0f;
     frame.pixels[4].maxNormalizedAboveNoise = 3.0f;
     frame.pixels[2].maxNormalizedAboveNoise = 2.0f;
-    const std::vector<Pixel> sorted = sortByMaxNormalizedAboveNoise(frame.pixels);
-    EXPECT_EQ(sorted[0].index, 4);
-    EXPECT_EQ(sorted[1].index, 2);
-    EXPECT_EQ(sorted[2].index, 9);
-    EXPECT_EQ(sorted[3].index, 0);
+    EXPECT_EQ(twoFirstIndices(frame.pixels), std::make_pair(4, 2));
 }
 
-TEST(HandStatsTest, SortingOrdersEqualKeysByAscendingIndexWhateverTheirPlaceInTheList) {
+TEST(HandStatsTest, EqualKeysComeByAscendingIndexWhateverTheirPlaceInTheList) {
     std::vector<Pixel> pixels;
     for (int i = 14; i >= 0; --i) pixels.emplace_back(i, 1.0f);  // O first, A last
     pixels[3].maxNormalizedAboveNoise = 2.0f;                     // "L"
     pixels[12].maxNormalizedAboveNoise = 2.0f;                    // "C"
-    const std::vector<Pixel> sorted = sortByMaxNormalizedAboveNoise(pixels);
-    EXPECT_EQ(sorted[0].index, 2);
-    EXPECT_EQ(sorted[1].index, 11);
-    for (size_t i = 3; i < 15; ++i) EXPECT_LT(sorted[i - 1].index, sorted[i].index);  // the rest, all at 0
+    EXPECT_EQ(twoFirstIndices(pixels), std::make_pair(2, 11));
+    pixels[3].maxNormalizedAboveNoise = 0.0f;
+    pixels[12].maxNormalizedAboveNoise = 0.0f;
+    EXPECT_EQ(twoFirstIndices(pixels), std::make_pair(0, 1));  // all at 0: "A" and "B", from the end
+}
+
+TEST(HandStatsTest, AKeyThatIsNotANumberComesLast) {
+    HandFrame frame;
+    frame.pixels[0].maxNormalizedAboveNoise = std::numeric_limits<float>::quiet_NaN();
+    frame.pixels[1].maxNormalizedAboveNoise = std::numeric_limits<float>::quiet_NaN();
+    EXPECT_EQ(twoFirstIndices(frame.pixels), std::make_pair(2, 3));
+}
+
+TEST(HandStatsTest, FewerThanTwoPixelsFailWithTheMessageVector) {
+    const std::vector<Pixel> one{Pixel(0, 1.0f)};
+    EXPECT_THROW(twoFirstByMaxNormalizedAboveNoise(one), std::out_of_range);
 }
 
 // A touch starting 100 ms after the last event: time bias 0.65.
