@@ -66,14 +66,14 @@ if [ "$stderr_empty" = 1 ] && [ -s "$work/stderr" ]; then
   head -20 "$work/stderr"
   failed=1
 fi
-if [ -n "$stderr_contains" ] && ! grep -qF -- "$stderr_contains" "$work/stderr"; then
-  echo "standard error lacks '$stderr_contains':"
-  head -20 "$work/stderr"
-  failed=1
-fi
-if [ -n "$stdout_contains" ] && ! grep -qF -- "$stdout_contains" "$work/stdout"; then
-  echo "standard output lacks '$stdout_contains':"
-  head -20 "$work/stdout"
-  failed=1
-fi
+# require_text NAME TEXT FILE: FILE must hold TEXT when TEXT is given.
+require_text() {
+  if [ -n "$2" ] && ! grep -qF -- "$2" "$3"; then
+    echo "$1 lacks '$2':"
+    head -20 "$3"
+    failed=1
+  fi
+}
+require_text "standard error" "$stderr_contains" "$work/stderr"
+require_text "standard output" "$stdout_contains" "$work/stdout"
 exit $failed
