@@ -29,11 +29,17 @@ TEST(PackagingTest, UdevRuleMatchesTheDefaultSurfaceIds) {
     EXPECT_NE(rules.find("KERNEL==\"uinput\", OWNER=\"tolkatouch\""), std::string::npos);
 }
 
+TEST(PackagingTest, TheUserAtTheSeatMayReadTheSurface) {
+    std::string rules = readFile(TOLKA_PACKAGING_DIR "/70-tolkatouch.rules");
+    EXPECT_NE(rules.find("MODE=\"0600\", TAG+=\"uaccess\"\n"), std::string::npos) << rules;
+}
+
 TEST(PackagingTest, UnitRunsSandboxedWithOnlyTheDevicesItNeeds) {
     std::string unit = readFile(TOLKA_PACKAGING_DIR "/tolkatouchd.service.in");
     for (const char* line : {"User=tolkatouch", "NoNewPrivileges=yes", "ProtectSystem=strict", "DevicePolicy=closed",
                              "DeviceAllow=char-hidraw rw", "DeviceAllow=/dev/uinput rw",
-                             "RuntimeDirectory=tolkatouch", "Type=notify", "ExecStart=@TOLKA_DAEMON_PATH@"}) {
+                             "RuntimeDirectory=tolkatouch", "Type=notify", "ExecStart=@TOLKA_DAEMON_PATH@",
+                             "IPAddressDeny=any", "ProcSubset=pid", "RemoveIPC=yes"}) {
         EXPECT_NE(unit.find(std::string("\n") + line + "\n"), std::string::npos) << line;
     }
 }
