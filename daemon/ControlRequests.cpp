@@ -1,6 +1,7 @@
 #include "daemon/ControlRequests.h"
 
 #include "daemon/ControlServer.h"
+#include "platform/Log.h"
 #include "platform/PropertyValueJson.h"
 #include "tolkatouch/Settings.h"
 
@@ -70,6 +71,26 @@ std::string answerControlRequest(const std::string& line, ControlTarget& target)
         auto ok = target.setProperty(service, key, written);
         if (!ok) return noSuchDevice(service);
         return dump(json{{"ok", *ok}});
+    }
+    if (auto it = request.find("log"); it != request.end()) {
+        // The process's log levels: the plug-in logs through the same table, so a change reaches
+        // its description lines from the next frame on.
+        if (it->is_string()) {
+            auto level = request.find("level");
+            const std::optional<int> minimum =
+                level != request.end() && level->is_string() ? SystemLog::levelFromName(level->get<std::string>())
+                                                              : std::nullopt;
+            if (!minimum) {
+                return error("malformed request: \"log\" takes a category (or *) and a \"level\": debug, info, "
+                             "default, error, fault or off");
+            }
+            const std::string category = it->get<std::string>();
+            SystemLog::setMinimumLevel(*minimum, category == "*" ? std::string() : category);
+            return dump(json{{"ok", true}});
+        }
+        json levels = json::object();
+        for (const auto& [category, name] : SystemLog::minimumLevels()) levels[category] = name;
+        return dump(json{{"levels", levels}});
     }
     if (auto it = request.find("devices"); it != request.end() && *it == true) {
         auto list = json::array();

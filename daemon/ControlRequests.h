@@ -3,6 +3,8 @@
 //   {"get": KEY}                 -> {"value": V}        (V null for a key nobody answers)
 //   {"set": KEY, "value": V}     -> {"ok": true|false}  (the service's answer)
 //   {"devices": true}            -> {"devices": [{"service": N, "node": PATH, "vendor": V, "product": P}]}
+//   {"log": true}                -> {"levels": {"*": LEVEL, CATEGORY: LEVEL, ...}}
+//   {"log": CATEGORY, "level": L} -> {"ok": true}  (CATEGORY "*" for every category)
 // "get" and "set" may name a device with "device": N (its service number); without it they go to
 // the first device. Anything else gets {"error": MESSAGE}.
 

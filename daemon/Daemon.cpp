@@ -268,8 +268,13 @@ void Daemon::handleSignal() {
         const int signal = static_cast<int>(info.ssi_signo);
         const char* name = sigabbrev_np(signal);
         if (signal == SIGHUP) {
-            // The daemon reads no configuration file yet; SIGHUP is acknowledged, not fatal.
-            _log.log("SIGHUP: nothing to read again");
+            // The log configuration is read again; a broken one leaves the levels as they were.
+            try {
+                applyLogSettings(_options.log);
+                _log.log("SIGHUP: log configuration read again");
+            } catch (const std::exception& error) {
+                _log.error("SIGHUP: %s", error.what());
+            }
             continue;
         }
         _log.log("stopping on SIG%s", name ? name : "?");

@@ -14,6 +14,7 @@
 #include <string>
 
 #include "daemon/ControlRequests.h"
+#include "daemon/LogSettings.h"
 #include "daemon/SurfaceIds.h"
 #include "platform/DispatchQueue.h"
 #include "platform/HIDDevice.h"
@@ -45,6 +46,7 @@ struct DaemonOptions {
     std::string keyLogPath;   // key writes to this file instead of the virtual keyboard
     std::string simulatePath; // a recording document to play as the device; empty: real devices
     float speed = 1.0f;       // pacing of the simulation
+    LogSettings log;          // read again on SIGHUP
 };
 
 class Daemon final : public ControlTarget {

@@ -120,7 +120,16 @@ int main(int argc, char** argv) {
         ->type_name("X")
         ->capture_default_str()
         ->check(CLI::PositiveNumber);
-    app.add_flag("--debug", debug, "log at debug level");
+    app.add_flag("--debug", debug, "log at debug level (as --log-level debug)");
+    app.add_option("--log-config", options.log.configurationPath,
+                   "the log configuration: one \"CATEGORY LEVEL\" per line (default " +
+                       std::string(TolkaTouch::kDefaultLogConfigurationPath) + ", if it exists); read again on SIGHUP")
+        ->type_name("FILE")
+        ->each([&options](const std::string&) { options.log.configurationRequired = true; });
+    app.add_option("--log-level", options.log.overrides,
+                   "the minimum level of one category, CATEGORY=LEVEL, or of all, LEVEL (debug, info, default, "
+                   "error, fault, off); over the configuration and TOLKATOUCH_LOG; repeatable")
+        ->type_name("[CATEGORY=]LEVEL");
     app.set_version_flag("--version", TolkaTouch::versionText("tolkatouchd"), "Print the version and exit");
     try {
         app.parse(argc, argv);
@@ -139,7 +148,14 @@ int main(int argc, char** argv) {
         std::fprintf(stderr, "tolkatouchd: --product: %s\n", error.c_str());
         return 1;
     }
-    if (debug) TolkaTouch::SystemLog::setDebugEnabled(true);
+    if (const char* environment = std::getenv("TOLKATOUCH_LOG")) options.log.environment = environment;
+    if (debug) options.log.overrides.push_back("debug");
+    try {
+        TolkaTouch::applyLogSettings(options.log);
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "tolkatouchd: %s\n", error.what());
+        return 2;
+    }
 
     int status = 0;
     try {

@@ -3,12 +3,14 @@
 #include <systemd/sd-journal.h>
 #include <syslog.h>
 
+#include <algorithm>
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
 #include <deque>
 #include <map>
 #include <sstream>
+#include <stdexcept>
 
 #include "platform/Format.h"
 
@@ -17,15 +19,20 @@ namespace TolkaTouch {
 const char* logLevelName(LogLevel level) {
     switch (level) {
     case LogLevel::Debug: return "debug";
+    case LogLevel::Info: return "info";
     case LogLevel::Default: return "default";
     case LogLevel::Error: return "error";
+    case LogLevel::Fault: return "fault";
     }
     return "?";
 }
 
 namespace {
 
-// Debug levels per category. Entries are never removed, so a Log may keep a pointer to its flag.
+constexpr int kDebug = static_cast<int>(LogLevel::Debug);
+constexpr int kDefault = static_cast<int>(LogLevel::Default);
+
+// Minimum levels per category. Entries are never removed, so a Log may keep a pointer to its level.
 class LevelTable {
 public:
     static LevelTable& shared() {
@@ -35,19 +42,26 @@ public:
         return table;
     }
 
-    const std::atomic<bool>* flag(const std::string& category) {
+    const std::atomic<int>* level(const std::string& category) {
         std::lock_guard lock(_mutex);
         return &entry(category);
     }
 
-    void set(bool enabled, const std::string& category) {
+    void set(int minimum, const std::string& category) {
         std::lock_guard lock(_mutex);
         if (category.empty()) {
-            _all = enabled;
-            for (auto& [name, flag] : _flags) flag.store(enabled, std::memory_order_relaxed);
+            _rest = minimum;
+            for (auto& [name, level] : _levels) level.store(minimum, std::memory_order_relaxed);
         } else {
-            entry(category).store(enabled, std::memory_order_relaxed);
+            entry(category).store(minimum, std::memory_order_relaxed);
         }
+    }
+
+    std::map<std::string, std::string> names() {
+        std::lock_guard lock(_mutex);
+        std::map<std::string, std::string> out{{"*", SystemLog::levelName(_rest)}};
+        for (const auto& [name, level] : _levels) out[name] = SystemLog::levelName(level.load());
+        return out;
     }
 
 private:
@@ -55,7 +69,7 @@ private:
         if (const char* env = std::getenv("TOLKATOUCH_DEBUG")) {
             std::string text(env);
             if (text == "1" || text == "all") {
-                _all = true;
+                _rest = kDebug;
             } else {
                 std::stringstream stream(text);
                 std::string name;
@@ -64,27 +78,31 @@ private:
         }
     }
 
-    std::atomic<bool>& entry(const std::string& category) {
-        auto it = _flags.find(category);
-        if (it == _flags.end()) {
-            bool enabled = _all;
-            for (const auto& name : _fromEnvironment) enabled = enabled || name == category;
-            it = _flags.try_emplace(category, enabled).first;
+    std::atomic<int>& entry(const std::string& category) {
+        auto it = _levels.find(category);
+        if (it == _levels.end()) {
+            int minimum = _rest;
+            for (const auto& name : _fromEnvironment) {
+                if (name == category) minimum = kDebug;
+            }
+            it = _levels.try_emplace(category, minimum).first;
         }
         return it->second;
     }
 
     std::mutex _mutex;
-    bool _all = false;
+    int _rest = kDefault;
     std::vector<std::string> _fromEnvironment;
-    std::map<std::string, std::atomic<bool>> _flags;
+    std::map<std::string, std::atomic<int>> _levels;
 };
 
 int journalPriority(LogLevel level) {
     switch (level) {
     case LogLevel::Debug: return LOG_DEBUG;
+    case LogLevel::Info: return LOG_INFO;
     case LogLevel::Default: return LOG_NOTICE;
     case LogLevel::Error: return LOG_ERR;
+    case LogLevel::Fault: return LOG_CRIT;
     }
     return LOG_NOTICE;
 }
@@ -141,9 +159,10 @@ struct SinkState {
 Log::Log(std::string subsystem, std::string category)
     : _subsystem(std::move(subsystem)),
       _category(std::move(category)),
-      _debugEnabled(LevelTable::shared().flag(_category)) {}
+      _minimum(LevelTable::shared().level(_category)) {}
 
 void Log::write(LogLevel level, std::string message) const {
+    if (!enabled(level)) return;
     LogRecord record{_subsystem, _category, level, std::move(message)};
     SinkState::shared().current()->write(record);
 }
@@ -158,6 +177,7 @@ void Log::debug(const char* format, ...) const {
 }
 
 void Log::log(const char* format, ...) const {
+    if (!enabled(LogLevel::Default)) return;
     va_list args;
     va_start(args, format);
     std::string message = formatStringV(format, args);
@@ -166,6 +186,7 @@ void Log::log(const char* format, ...) const {
 }
 
 void Log::error(const char* format, ...) const {
+    if (!enabled(LogLevel::Error)) return;
     va_list args;
     va_start(args, format);
     std::string message = formatStringV(format, args);
@@ -175,7 +196,47 @@ void Log::error(const char* format, ...) const {
 
 namespace SystemLog {
 
-void setDebugEnabled(bool enabled, const std::string& category) { LevelTable::shared().set(enabled, category); }
+void setDebugEnabled(bool enabled, const std::string& category) {
+    LevelTable::shared().set(enabled ? kDebug : kDefault, category);
+}
+
+void setMinimumLevel(int minimum, const std::string& category) { LevelTable::shared().set(minimum, category); }
+
+std::map<std::string, std::string> minimumLevels() { return LevelTable::shared().names(); }
+
+std::optional<int> levelFromName(const std::string& name) {
+    for (int level = kDebug; level <= kLogOff; ++level) {
+        if (name == levelName(level)) return level;
+    }
+    return std::nullopt;
+}
+
+const char* levelName(int minimum) {
+    return minimum >= kLogOff ? "off" : logLevelName(static_cast<LogLevel>(minimum));
+}
+
+void applyConfiguration(const std::string& text) {
+    std::vector<std::pair<std::string, int>> settings;
+    std::istringstream lines(text);
+    std::string line;
+    for (int number = 1; std::getline(lines, line); ++number) {
+        if (const size_t hash = line.find('#'); hash != std::string::npos) line.erase(hash);
+        std::istringstream words(line);
+        std::string category, level, extra;
+        if (!(words >> category)) continue;
+        const bool complete = static_cast<bool>(words >> level) && !(words >> extra);
+        const std::optional<int> minimum = complete ? levelFromName(level) : std::nullopt;
+        if (!minimum) {
+            throw std::invalid_argument("line " + std::to_string(number) +
+                                        ": expected a category (or *) and one of debug, info, default, error, "
+                                        "fault, off");
+        }
+        settings.emplace_back(category == "*" ? std::string() : category, *minimum);
+    }
+    // "*" first, so that a line for one category is not undone by a later "*".
+    std::stable_partition(settings.begin(), settings.end(), [](const auto& entry) { return entry.first.empty(); });
+    for (const auto& [category, minimum] : settings) setMinimumLevel(minimum, category);
+}
 
 void setSink(std::shared_ptr<LogSink> sink) {
     auto& state = SinkState::shared();

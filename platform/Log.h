@@ -1,10 +1,13 @@
 #pragma once
 // Log: a handle on the system log for one subsystem and category, with levels debug, default and
-// error. Whether debug is on is one atomic load, so callers test it before building costly text.
-// Lines go to the journal when running as a service, to standard error otherwise, or to a sink a
-// test installs.
+// error. Which levels are kept is the host's: a minimum level per category (debug, info, default,
+// error, fault, or off), set from a configuration, the command line or at run time. Whether a
+// level is on is one atomic load, so callers test it before building costly text. Lines go to the
+// journal when running as a service, to standard error otherwise, or to a sink a test installs.
 
+#include <map>
 #include <memory>
+#include <optional>
 #include <mutex>
 #include <string>
 #include <vector>
@@ -13,9 +16,12 @@
 
 namespace TolkaTouch {
 
-enum class LogLevel { Debug, Default, Error };
+enum class LogLevel { Debug, Info, Default, Error, Fault };
 
 const char* logLevelName(LogLevel level);
+
+// A category's minimum level: the levels kept are this one and those above it; kLogOff keeps none.
+inline constexpr int kLogOff = static_cast<int>(LogLevel::Fault) + 1;
 
 struct LogRecord {
     std::string subsystem;
@@ -38,7 +44,8 @@ public:
     const std::string& subsystem() const { return _subsystem; }
     const std::string& category() const { return _category; }
 
-    bool debugEnabled() const { return _debugEnabled->load(std::memory_order_relaxed); }
+    bool enabled(LogLevel level) const { return static_cast<int>(level) >= _minimum->load(std::memory_order_relaxed); }
+    bool debugEnabled() const { return enabled(LogLevel::Debug); }
 
     // printf-style; "%@" of the host's formats is written as "%s" with an object's description.
     void debug(const char* format, ...) const __attribute__((format(printf, 2, 3)));
@@ -49,16 +56,30 @@ public:
 private:
     std::string _subsystem;
     std::string _category;
-    const std::atomic<bool>* _debugEnabled;  // owned by the process-wide level table
+    const std::atomic<int>* _minimum;  // owned by the process-wide level table
 };
 
 // Process-wide settings of the system log stand-in.
 namespace SystemLog {
 
-// Turns the debug level on or off for one category, or for every category when it is empty.
-// The environment variable TOLKATOUCH_DEBUG ("1" or "all", or a comma-separated list of
-// categories) sets the starting levels.
+// Turns the debug level on (minimum debug) or off (minimum default) for one category, or for every
+// category when it is empty. The environment variable TOLKATOUCH_DEBUG ("1" or "all", or a
+// comma-separated list of categories) turns it on from the start.
 void setDebugEnabled(bool enabled, const std::string& category = {});
+
+// The minimum level of one category, or of every category when it is empty (which also becomes
+// the level of categories not seen yet).
+void setMinimumLevel(int minimum, const std::string& category = {});
+// Every category seen so far with its minimum level's name, and "*" with the level of the rest.
+std::map<std::string, std::string> minimumLevels();
+// "debug", "info", "default", "error", "fault", "off"; nothing for any other word.
+std::optional<int> levelFromName(const std::string& name);
+const char* levelName(int minimum);
+
+// Applies a log configuration: one "CATEGORY LEVEL" per line ("*" for every category), "#"
+// comments and blank lines allowed. Throws std::invalid_argument naming the first line that does
+// not read; nothing is applied then.
+void applyConfiguration(const std::string& text);
 
 // Where lines go: a sink of the caller's, or the default (journal or standard error) when null.
 void setSink(std::shared_ptr<LogSink> sink);

@@ -20,5 +20,6 @@ void addUhidCommand(CLI::App& app);
 void addKeysCommand(CLI::App& app);
 void addPropCommand(CLI::App& app);
 void addDevicesCommand(CLI::App& app);
+void addLogCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

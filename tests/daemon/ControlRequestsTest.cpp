@@ -5,6 +5,10 @@
 
 #include <map>
 
+#include <nlohmann/json.hpp>
+
+#include "platform/Log.h"
+
 namespace TolkaTouch {
 namespace {
 
@@ -91,6 +95,20 @@ TEST(ControlRequestsTest, KeysOutsideTheSettingsDomainsPassAsTheyAre) {
     FakeTarget target;
     EXPECT_EQ(answerControlRequest(R"({"set": "ServicePluginDebug", "value": 3})", target), R"({"ok":true})");
     EXPECT_EQ(target.properties["ServicePluginDebug"], PropertyValue(3u));
+}
+
+TEST(ControlRequestsTest, LogLevelsAreShownAndChangedForTheWholeProcess) {
+    FakeTarget target;
+    const Log algs("com.zantor.hid.TolkaTouch", "ControlAlgs");
+    EXPECT_EQ(answerControlRequest(R"({"log": "ControlAlgs", "level": "debug"})", target), R"({"ok":true})");
+    EXPECT_TRUE(algs.debugEnabled());
+    const auto levels = nlohmann::json::parse(answerControlRequest(R"({"log": true})", target));
+    EXPECT_EQ(levels["levels"]["ControlAlgs"], "debug");
+    EXPECT_EQ(levels["levels"]["*"], "default");
+    EXPECT_EQ(answerControlRequest(R"({"log": "ControlAlgs", "level": "default"})", target), R"({"ok":true})");
+    EXPECT_FALSE(algs.debugEnabled());
+    EXPECT_EQ(answerControlRequest(R"({"log": "ControlAlgs", "level": "loud"})", target),
+              R"({"error":"malformed request: \"log\" takes a category (or *) and a \"level\": debug, info, default, error, fault or off"})");
 }
 
 TEST(ControlRequestsTest, DevicesListsServiceNodeAndIds) {

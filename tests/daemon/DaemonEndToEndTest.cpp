@@ -215,6 +215,36 @@ TEST_F(DaemonEndToEndTest, PropListShowsEverySettingAndPropSetRefusesAMisspeltOn
     EXPECT_EQ(daemon->wait(10s), 0);
 }
 
+TEST_F(DaemonEndToEndTest, TolkatouchLogTurnsTheDescriptionLinesOnAndOffOnTheRunningService) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    const auto descriptions = [&] {
+        const std::string err = daemon->standardError();
+        size_t count = 0;
+        for (size_t at = err.find("Touch State Description"); at != std::string::npos;
+             at = err.find("Touch State Description", at + 1)) {
+            ++count;
+        }
+        return count;
+    };
+    EXPECT_EQ(descriptions(), 0u);
+    std::string out, err;
+    ASSERT_EQ(tool({"log", "Algs", "debug"}, &out, &err), 0) << err;
+    auto deadline = std::chrono::steady_clock::now() + 5s;
+    while (descriptions() == 0 && std::chrono::steady_clock::now() < deadline) std::this_thread::sleep_for(5ms);
+    EXPECT_GT(descriptions(), 0u);
+    ASSERT_EQ(tool({"log"}, &out, &err), 0) << err;
+    EXPECT_NE(out.find("Algs         debug\n"), std::string::npos) << out;
+    ASSERT_EQ(tool({"log", "Algs", "default"}, &out, &err), 0) << err;
+    std::this_thread::sleep_for(100ms);  // a frame in flight may still finish its lines
+    const size_t stopped = descriptions();
+    std::this_thread::sleep_for(300ms);
+    EXPECT_EQ(descriptions(), stopped);
+    EXPECT_EQ(tool({"log", "Algs", "loud"}, &out, &err), 1);
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
 TEST_F(DaemonEndToEndTest, UnknownPropertyReadsNullAndToolReportsDaemonErrors) {
     auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
     ::close(connectControl());

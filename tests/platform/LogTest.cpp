@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <stdexcept>
 #include <string>
 
 #include "platform/PropertyValue.h"
@@ -34,6 +35,54 @@ TEST_F(LogTest, LevelNamesAreDebugDefaultAndError) {
     EXPECT_STREQ(logLevelName(LogLevel::Debug), "debug");
     EXPECT_STREQ(logLevelName(LogLevel::Default), "default");
     EXPECT_STREQ(logLevelName(LogLevel::Error), "error");
+}
+
+TEST_F(LogTest, AMinimumLevelKeepsThatLevelAndThoseAboveIt) {
+    const Log log(kSubsystem, "Levels");
+    SystemLog::setMinimumLevel(static_cast<int>(LogLevel::Error), "Levels");
+    log.debug("d");
+    log.log("default");
+    log.error("e");
+    EXPECT_EQ(sink->messages(), (std::vector<std::string>{"e"}));
+    SystemLog::setMinimumLevel(kLogOff, "Levels");
+    log.error("dropped");
+    EXPECT_EQ(sink->messages(), (std::vector<std::string>{"e"}));
+    SystemLog::setMinimumLevel(static_cast<int>(LogLevel::Debug), "Levels");
+    EXPECT_TRUE(log.debugEnabled());
+    SystemLog::setMinimumLevel(static_cast<int>(LogLevel::Default), "Levels");
+}
+
+TEST_F(LogTest, LevelNamesReadBackAndOtherWordsAreNoLevel) {
+    for (const char* name : {"debug", "info", "default", "error", "fault", "off"}) {
+        const auto level = SystemLog::levelFromName(name);
+        ASSERT_TRUE(level) << name;
+        EXPECT_STREQ(SystemLog::levelName(*level), name);
+    }
+    EXPECT_FALSE(SystemLog::levelFromName("verbose"));
+}
+
+TEST_F(LogTest, AConfigurationSetsEachCategoryAndTheRest) {
+    const Log algs(kSubsystem, "ConfiguredAlgs");
+    const Log other(kSubsystem, "ConfiguredOther");
+    SystemLog::applyConfiguration("# levels\nConfiguredAlgs debug\n\n* error   # everything else\n");
+    EXPECT_TRUE(algs.debugEnabled());
+    EXPECT_FALSE(other.enabled(LogLevel::Default));
+    EXPECT_TRUE(other.enabled(LogLevel::Error));
+    EXPECT_EQ(SystemLog::minimumLevels().at("*"), "error");
+    EXPECT_EQ(SystemLog::minimumLevels().at("ConfiguredAlgs"), "debug");
+    SystemLog::applyConfiguration("* default\n");
+}
+
+TEST_F(LogTest, AConfigurationLineThatDoesNotReadIsRefusedAndNothingIsApplied) {
+    const Log log(kSubsystem, "Refused");
+    try {
+        SystemLog::applyConfiguration("Refused debug\nAlgs loud\n");
+        FAIL() << "taken";
+    } catch (const std::invalid_argument& error) {
+        EXPECT_STREQ(error.what(),
+                     "line 2: expected a category (or *) and one of debug, info, default, error, fault, off");
+    }
+    EXPECT_FALSE(log.debugEnabled());
 }
 
 TEST_F(LogTest, LogKeepsItsSubsystemAndCategory) {
