@@ -10,6 +10,13 @@
 namespace TolkaTouch::Tools {
 namespace {
 
+ReplayOptions pacedAt(float speed, bool fast) {
+    ReplayOptions options;
+    options.speed = speed;
+    options.fast = fast;
+    return options;
+}
+
 PipelineRecording tapRecording() {
     return recordingFromSynthesis(synthesize(GestureScript::parse("wait 200ms\ntap volume-down 120ms\nwait 300ms\n"), 1));
 }
@@ -19,7 +26,7 @@ TEST(ReplayerTest, EventsCarryTheRecordedHostClockTimes) {
     const uint64_t first = recording.frames().front().timestamp;
     Replayer replayer(std::move(recording));
     std::vector<std::string> lines;
-    replayer.run(ReplayOptions{1.0f, true, {}}, [&](const HIDEvent& event) {
+    replayer.run(pacedAt(1.0f, true), [&](const HIDEvent& event) {
         EXPECT_GE(event.timestamp, kSynthesisStartNs);
         lines.push_back(eventHumanLine(event, replayer.secondsSinceStart(event)));
     });
@@ -45,7 +52,7 @@ TEST(ReplayerTest, PacedReplaySleepsTheRecordedGapsDividedByTheSpeed) {
     // while every frame still arrives.
     Replayer replayer(tapRecording());
     int events = 0;
-    replayer.run(ReplayOptions{100.0f, false, {}}, [&](const HIDEvent&) { ++events; });
+    replayer.run(pacedAt(100.0f, false), [&](const HIDEvent&) { ++events; });
     EXPECT_EQ(events, 2);
 }
 

@@ -19,7 +19,9 @@ TEST(StatsPrinterTest, FreshPipelineHasNoNonZeroCounters) {
 
 TEST(StatsPrinterTest, TableAlignsTheNonZeroCounters) {
     Replayer replayer(recordingFromSynthesis(synthesize(GestureScript::parse("wait 200ms\ntap volume-up 120ms\nwait 300ms\nreset\nwait 100ms\n"), 1)));
-    replayer.run(ReplayOptions{1.0f, true, {}}, [](const HIDEvent&) {});
+    ReplayOptions fast;
+    fast.fast = true;
+    replayer.run(fast, [](const HIDEvent&) {});
     EXPECT_EQ(statsTable(replayer.pipeline()),
               "ResetCount          1\n"
               "DisjointImageCount  1\n"
