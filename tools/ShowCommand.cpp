@@ -1,18 +1,17 @@
 // tolkatouch show: prints a recording's frames: images drawn on the pixel layout, firmware
 // events and settings, with times relative to the first frame.
 
-#include <cinttypes>
 #include <cstdio>
 #include <memory>
 #include <optional>
 #include <string>
 
 #include <CLI/CLI.hpp>
+#include <fmt/format.h>
 
-#include "platform/PropertyValueJson.h"
 #include "common/Reports.h"
 #include "common/Util.h"
-#include "platform/Format.h"
+#include "platform/PropertyValueJson.h"
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"
 
@@ -36,12 +35,12 @@ std::string describeFrame(const PipelineRecording::Frame& frame, bool raw) {
     const uint8_t* bytes = frame.report.data();
     const size_t length = frame.report.size();
     if (auto event = InputReport::FirmwareEvent::parse(bytes, length)) {
-        return formatString("firmware event %u%s, context 0x%016" PRIx64 "\n", event->event,
-                            event->event == InputReport::FirmwareEvent::kReset ? " (reset)" : "", event->contextValue());
+        return fmt::format("firmware event {}{}, context 0x{:016x}\n", event->event,
+                           event->event == InputReport::FirmwareEvent::kReset ? " (reset)" : "", event->contextValue());
     }
     // The drawing starts with its own "# Image frame" line; a blank line sets it off from the next.
     if (auto image = InputReport::Image::parse(bytes, length)) return Util::stringFromImage(*image, raw) + "\n";
-    return formatString("report of %zu bytes that is neither an image nor a firmware event: ", length) +
+    return fmt::format("report of {} bytes that is neither an image nor a firmware event: ", length) +
            Util::hexStringFromBytes(frame.report) + "\n";
 }
 
@@ -59,7 +58,7 @@ void runShow(const ShowArguments& arguments) {
         }
         // Signed: a frame stamped before the first one shows as negative.
         const double seconds = static_cast<double>(static_cast<int64_t>(frame.timestamp - first)) / 1e9;
-        const std::string text = formatString("@ %.3fs  ", seconds) + describeFrame(frame, arguments.raw);
+        const std::string text = fmt::format("@ {:.3f}s  ", seconds) + describeFrame(frame, arguments.raw);
         std::fputs(text.c_str(), stdout);
         shown = true;
     }
