@@ -21,6 +21,24 @@ namespace {
 constexpr int kExitFailure = 1;
 constexpr int kExitUsage = 2;
 
+// An error line may quote what came from outside (a path, a script's word, a document's text):
+// control characters are shown escaped, so that none reaches the terminal as a command.
+std::string printable(const std::string& text) {
+    std::string out;
+    for (const char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        if (byte < 0x20 || byte == 0x7f) {
+            static constexpr char kDigits[] = "0123456789abcdef";
+            out += "\\x";
+            out += kDigits[byte >> 4];
+            out += kDigits[byte & 0xF];
+        } else {
+            out += c;
+        }
+    }
+    return out;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -47,7 +65,7 @@ int main(int argc, char** argv) {
         for (const CLI::App* command : app.get_subcommands({})) names.push_back(command->get_name());
         if (std::find(names.begin(), names.end(), argv[1]) == names.end()) {
             std::fprintf(stderr, "tolkatouch: unknown subcommand \"%s\" (did you mean \"%s\"?)\n",
-                         argv[1], TolkaTouch::nearestWord(argv[1], names).c_str());
+                         printable(argv[1]).c_str(), TolkaTouch::nearestWord(argv[1], names).c_str());
             return kExitUsage;
         }
     }
@@ -61,15 +79,15 @@ int main(int argc, char** argv) {
         return kExitUsage;
     } catch (const TolkaTouch::SettingError& error) {
         std::fflush(stdout);
-        std::fprintf(stderr, "tolkatouch: %s\n", error.what());
+        std::fprintf(stderr, "tolkatouch: %s\n", printable(error.what()).c_str());
         return kExitUsage;
     } catch (const ToolError& error) {
         std::fflush(stdout);
-        std::fprintf(stderr, "tolkatouch: %s\n", error.what());
+        std::fprintf(stderr, "tolkatouch: %s\n", printable(error.what()).c_str());
         return kExitFailure;
     } catch (const std::exception& error) {
         std::fflush(stdout);
-        std::fprintf(stderr, "tolkatouch: %s\n", error.what());
+        std::fprintf(stderr, "tolkatouch: %s\n", printable(error.what()).c_str());
         return kExitFailure;
     }
     return 0;

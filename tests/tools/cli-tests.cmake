@@ -135,3 +135,9 @@ tolka_add_cli_test(AMistypedSubcommandIsNamedWithTheNearestOne
   -- reply --fast)
 tolka_add_cli_test(VersionPrintsTheProgramAndItsVersion
   --stderr-empty --stdout-contains "tolkatouch ${PROJECT_VERSION}" -- --version)
+# An escape character (no brackets: CMake lists treat them specially).
+string(ASCII 27 escape)
+tolka_add_cli_test(ControlCharactersInAnErrorAreShownEscaped
+  --exit 2 --stdout-empty
+  --stderr-text "tolkatouch: unknown subcommand \"\\x1bcreplay\" (did you mean \"replay\"?)"
+  -- "${escape}creplay")
