@@ -11,14 +11,15 @@
 #include <cstring>
 #include <stdexcept>
 
+#include "common/FeatureReports.h"
 #include "daemon/ControlServer.h"
 #include "daemon/CountingHIDDevice.h"
 #include "daemon/DeviceDiscovery.h"
 #include "daemon/KeyLogOutput.h"
 #include "daemon/KeyMapper.h"
 #include "daemon/PluginInstance.h"
-#include "daemon/Signals.h"
 #include "daemon/PluginLibrary.h"
+#include "daemon/Signals.h"
 #include "daemon/SimulationFeeder.h"
 #include "daemon/UinputKeyOutput.h"
 #include "tolkatouch/Gesture.h"
@@ -145,6 +146,8 @@ void Daemon::startDevices() {
     properties.emplace("Transport", PropertyValue("Virtual"));
     _simulated = SimulatedHIDDevice::create(std::move(properties));
     if (!_simulated) throw std::runtime_error("cannot create the simulated device");
+    // The feature reports a real surface answers, as the virtual surface of `tolkatouch uhid` does.
+    for (auto& [id, bytes] : defaultFeatureReports()) _simulated->setFeatureReport(id, std::move(bytes));
     _simulatedCounter = std::make_shared<CountingHIDDevice>(_simulated);
     addDevice("simulated:" + _options.simulatePath, _options.vendor, _options.product, _simulatedCounter);
     if (_devices.empty()) throw std::runtime_error("the plug-in did not take the simulated device");

@@ -1,5 +1,6 @@
 #include "tools/VirtualSurface.h"
 
+#include "common/FeatureReports.h"
 #include "platform/Hex.h"
 
 #include <fcntl.h>
@@ -19,8 +20,6 @@ namespace TolkaTouch {
 
 namespace {
 
-constexpr uint32_t kDefaultHoldDuration = 5000;
-
 void writeEvent(int fd, const uhid_event& event) {
     ssize_t written;
     do {
@@ -33,20 +32,7 @@ void writeEvent(int fd, const uhid_event& event) {
 }  // namespace
 
 std::map<uint8_t, std::vector<uint8_t>> VirtualSurface::defaultFeatureReports() {
-    std::map<uint8_t, std::vector<uint8_t>> reports;
-    reports[ReportDescriptor::kFactoryResetHoldDurationReport.id] = {
-        ReportDescriptor::kFactoryResetHoldDurationReport.id,
-        uint8_t(kDefaultHoldDuration),
-        uint8_t(kDefaultHoldDuration >> 8),
-        uint8_t(kDefaultHoldDuration >> 16),
-        uint8_t(kDefaultHoldDuration >> 24),
-    };
-    for (const auto& report : ReportDescriptor::kDiagnosticReports) {
-        std::vector<uint8_t> bytes(1 + report.payloadLength);
-        for (size_t i = 0; i < bytes.size(); ++i) bytes[i] = uint8_t(report.id + i);
-        reports[report.id] = bytes;
-    }
-    return reports;
+    return TolkaTouch::defaultFeatureReports();
 }
 
 uint8_t VirtualSurface::reportIDFromText(const std::string& text) {

@@ -196,6 +196,19 @@ TEST_F(DaemonEndToEndTest, PropertiesCanBeReadAndWrittenWhileReportsFlow) {
     EXPECT_EQ(daemon->wait(10s), 0);
 }
 
+TEST_F(DaemonEndToEndTest, TheSimulatedSurfaceAnswersFeatureReportsAsARealOneDoes) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    std::string out, err;
+    ASSERT_EQ(tool({"prop", "get", "FactoryResetHoldDuration"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "5000\n");
+    ASSERT_EQ(tool({"prop", "get", "FirmwareDebugReports"}, &out, &err), 0) << err;
+    EXPECT_EQ(out.find("null"), std::string::npos) << out;
+    EXPECT_EQ(out.find("Failed"), std::string::npos) << out;
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
 TEST_F(DaemonEndToEndTest, PropListShowsEverySettingAndPropSetRefusesAMisspeltOne) {
     auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
     ::close(connectControl());
