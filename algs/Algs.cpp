@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <sstream>
+#include <stdexcept>
+#include <utility>
 
 #include "algs/Descriptions.h"
 #include "common/Util.h"
@@ -26,24 +28,27 @@ uint64_t factorIndex(const std::string& text) {
     return index;
 }
 
+template <size_t... I>
+std::array<Pixel, sizeof...(I)> makePixels(std::index_sequence<I...>) {
+    return {Pixel(static_cast<int>(I), Algs::pixelGains[I])...};
+}
+
+// The factor is copied into the virtual pixel: a later "VirtualNormalizationFactors" change
+// reaches the virtual image's list only. The index starts as the first letter's character code;
+// the first frame replaces it with the strongest member's pixel index.
+template <size_t... I>
+std::array<VirtualPixel, sizeof...(I)> makeVirtualPixels(const VirtualImage& image, std::index_sequence<I...>) {
+    return {VirtualPixel(static_cast<int>(static_cast<signed char>(image.groups.at(I)[0])),
+                         image.normalizationFactors.at(I), image.groups.at(I))...};
+}
+
 }  // namespace
 
-Algs::Algs() : log(kSubsystem, kCategory) {
-    // The virtual image, hand state and counters are built by their own defaults; the pixels next.
-    pixels.reserve(kPixelCount);
-    for (size_t i = 0; i < kPixelCount; ++i) pixels.emplace_back(static_cast<int>(i), pixelGains[i]);
-
-    // The factor is copied into the virtual pixel: a later "VirtualNormalizationFactors" change
-    // reaches the virtual image's list only. The index starts as the first letter's character code;
-    // the first frame replaces it with the strongest member's pixel index.
-    virtualPixels.reserve(virtualImage.groups.size());
-    for (size_t i = 0; i < virtualImage.groups.size(); ++i) {
-        const std::string& group = virtualImage.groups[i];
-        virtualPixels.emplace_back(static_cast<int>(static_cast<signed char>(group[0])),
-                                   virtualImage.normalizationFactors[i], group);
-    }
-    lastEventPhase = 0;
-}
+// The virtual image, hand state and counters are built by their own defaults.
+Algs::Algs()
+    : log(kSubsystem, kCategory),
+      pixels(makePixels(std::make_index_sequence<kPixelCount>())),
+      virtualPixels(makeVirtualPixels(virtualImage, std::make_index_sequence<kVirtualPixelCount>())) {}
 
 EventList Algs::handleImage(const InputReport::Image& image) {
     EventList out;
@@ -61,7 +66,7 @@ EventList Algs::handleReset() {
 void Algs::processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint32_t timeMs, EventList& out) {
     const float threshold = handStats.ActivationThreshold;
 
-    // 1. The real pixels.
+    // 1. The real pixels, in index order.
     for (size_t i = 0; i < kPixelCount; ++i) pixels[i].updatePixelState(readings[i], threshold);
 
     // 2. The group sums.
@@ -69,9 +74,12 @@ void Algs::processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint
 
     // 3. The virtual pixels. The group sum is narrowed to 16 bits, so one above 32767 wraps to a
     // negative value; the tuned factors and thresholds expect exactly that.
-    for (size_t i = 0; i < virtualImage.groups.size(); ++i) {
-        const int value = static_cast<int16_t>(virtualImage.values.at(i));
-        virtualPixels.at(i).updatePixelState(value, threshold, virtualImage.strongest.at(i));
+    if (virtualImage.values.size() < kVirtualPixelCount || virtualImage.strongest.size() < kVirtualPixelCount) {
+        throw std::out_of_range("vector");
+    }
+    for (size_t i = 0; i < kVirtualPixelCount; ++i) {
+        const int value = static_cast<int16_t>(virtualImage.values[i]);
+        virtualPixels[i].updatePixelState(value, threshold, virtualImage.strongest[i]);
     }
 
     // 4. The hand state machine reads this frame's snapshot of both pixel lists, and decides once
@@ -180,7 +188,7 @@ FrameSnapshot Algs::snapshotOf(const int16_t* readings, uint32_t frameNumber, ui
         frame.pixelOn[i] = pixels[i].isOn;
     }
     for (size_t i = 0; i < kVirtualPixelCount; ++i) {
-        frame.virtualValues[i] = virtualPixels.at(i).value;
+        frame.virtualValues[i] = virtualPixels[i].value;
         frame.virtualNormalized[i] = virtualPixels[i].normalized;
         frame.virtualOn[i] = virtualPixels[i].isOn;
     }
@@ -191,8 +199,8 @@ FrameSnapshot Algs::snapshotOf(const int16_t* readings, uint32_t frameNumber, ui
     frame.durationRatio = hand.durationRatio;
     frame.activePixelCount = hand.activePixelCount;
     frame.tapScore = hand.tapScore;
-    frame.touching = hand.touching;
-    frame.aboveNoise = hand.isAboveNoise;
+    frame.touching = hand.touching();
+    frame.aboveNoise = hand.isAboveNoise();
     // Signed 32-bit durations, as the firmware clock wraps.
     frame.sinceTouchStartMs = static_cast<int32_t>(timeMs - hand.touchStartTime);
     frame.touchLengthMs = static_cast<int32_t>(hand.touchEndTime - hand.touchStartTime);

@@ -60,9 +60,9 @@ public:
 
     // The recognizer's state, open for inspection.
     Log log;
-    std::vector<Pixel> pixels;                // A..O
-    VirtualImage virtualImage;                // the groups, their sums and factors
-    std::vector<VirtualPixel> virtualPixels;  // one per group, in group order
+    std::array<Pixel, kPixelCount> pixels;                      // A..O
+    VirtualImage virtualImage;                                  // the groups, their sums and factors
+    std::array<VirtualPixel, kVirtualPixelCount> virtualPixels;  // one per group, in group order
     HandStats handStats;                      // also holds the tuning settings
     EventStats eventStats;
     int16_t lastEventPhase = 0;  // phase of the last event emitted

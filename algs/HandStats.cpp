@@ -91,79 +91,79 @@ void HandStats::updateHandState(std::span<const Pixel> pixels, std::span<const V
     for (const VirtualPixel& pixel : virtualPixels) scan(pixel);
 
     // 2.
-    wasTouching = touching;
-    touching = someOn;
-    wasAboveNoise = isAboveNoise;
-    isAboveNoise = someAboveNoise;
+    _wasTouching = _touching;
+    _touching = someOn;
+    _wasAboveNoise = _isAboveNoise;
+    _isAboveNoise = someAboveNoise;
 
-    // 3. The region: followed by its strength while holding (last frame's verdict), chosen afresh
+    // 3. The region: followed by its strength while _holding (last frame's verdict), chosen afresh
     // otherwise.
-    if (touching) {
-        activeRegion = holding ? changeActiveRegion(pixels, strongestIndex)
+    if (_touching) {
+        activeRegion = _holding ? changeActiveRegion(pixels, strongestIndex)
                                : updateActiveRegion(pixels, virtualPixels, time);
     }
 
     // 4. Edge times.
-    if (isAboveNoise && !wasAboveNoise) noiseStartTime = time;
-    if (!isAboveNoise && wasAboveNoise) noiseEndTime = time;
-    if (touching && !wasTouching) touchStartTime = time;
-    if (!touching && wasTouching) touchEndTime = time;
+    if (_isAboveNoise && !_wasAboveNoise) noiseStartTime = time;
+    if (!_isAboveNoise && _wasAboveNoise) noiseEndTime = time;
+    if (_touching && !_wasTouching) touchStartTime = time;
+    if (!_touching && _wasTouching) touchEndTime = time;
 
     // 5.
     updateTouchScore(pixels, virtualPixels, time);
     updateTapRejection(pixels, virtualPixels);
 
     // 6. Last frame's flags; the exceed flag from before this frame's decision decides the tap.
-    wasHolding = holding;
-    const bool holdTimeWasExceeded = holdTimeExceeded;
-    wasHoldTimeExceeded = holdTimeExceeded;
-    wasHoldSuppressed = isHoldSuppressed;
+    _wasHolding = _holding;
+    const bool holdTimeWasExceeded = _holdTimeExceeded;
+    _wasHoldTimeExceeded = _holdTimeExceeded;
+    _wasHoldSuppressed = _isHoldSuppressed;
 
     // 7. Hold decision.
     const uint32_t elapsed = time - touchStartTime;
     if (EnableHoldSuppression) {
-        if (touching && elapsed > HoldTimeoutMilliseconds) {
-            holdTimeExceeded = true;
-            holding = touchScore >= holdScoreThreshold || wasHolding;
-            isHoldSuppressed = touchScore < holdScoreThreshold && !wasHolding;
+        if (_touching && elapsed > HoldTimeoutMilliseconds) {
+            _holdTimeExceeded = true;
+            _holding = touchScore >= holdScoreThreshold || _wasHolding;
+            _isHoldSuppressed = touchScore < holdScoreThreshold && !_wasHolding;
         } else {
-            holding = false;
-            isHoldSuppressed = false;
-            holdTimeExceeded = false;
+            _holding = false;
+            _isHoldSuppressed = false;
+            _holdTimeExceeded = false;
         }
     } else {
         // The exceed flag is not kept up here, so every touch end counts as a tap, also after a hold.
-        holding = touching && elapsed > HoldTimeoutMilliseconds;
+        _holding = _touching && elapsed > HoldTimeoutMilliseconds;
     }
-    const bool holdEnded = wasHolding && !holding;
+    const bool holdEnded = _wasHolding && !_holding;
 
     // 8. Tap decision.
-    const bool touchEnded = !touching && wasTouching;
+    const bool touchEnded = !_touching && _wasTouching;
     if (EnableTapSuppression) {
         if (touchEnded) {
             if (holdTimeWasExceeded) {
-                tapCandidate = false;
-                tapDetected = false;
-                isTapRejected = false;
+                _tapCandidate = false;
+                _tapDetected = false;
+                _isTapRejected = false;
             } else {
-                tapCandidate = true;
-                tapDetected = !isTapRejected;
+                _tapCandidate = true;
+                _tapDetected = !_isTapRejected;
             }
         } else {
-            tapCandidate = false;
-            tapDetected = false;
-            isTapRejected = false;
+            _tapCandidate = false;
+            _tapDetected = false;
+            _isTapRejected = false;
         }
-    } else if (touching) {
-        tapCandidate = false;
-        tapDetected = false;
+    } else if (_touching) {
+        _tapCandidate = false;
+        _tapDetected = false;
     } else {
-        tapCandidate = wasTouching && !holdTimeWasExceeded;
-        tapDetected = tapCandidate;
+        _tapCandidate = _wasTouching && !holdTimeWasExceeded;
+        _tapDetected = _tapCandidate;
     }
 
     // 9. A tap or the end of a hold is the last event, for the region-keeping rule.
-    if (tapDetected || holdEnded) {
+    if (_tapDetected || holdEnded) {
         lastEventTime = time;
         eventRegion = activeRegion;
     }
@@ -172,30 +172,30 @@ void HandStats::updateHandState(std::span<const Pixel> pixels, std::span<const V
 FrameVerdict HandStats::verdict() const {
     FrameVerdict verdict;
     verdict.region = activeRegion;
-    verdict.holdSuppressed = isHoldSuppressed;
-    if (holdTimeExceeded) {
-        verdict.holdClock = wasHoldTimeExceeded ? HoldClock::Past : HoldClock::Reached;
+    verdict.holdSuppressed = _isHoldSuppressed;
+    if (_holdTimeExceeded) {
+        verdict.holdClock = _wasHoldTimeExceeded ? HoldClock::Past : HoldClock::Reached;
     } else {
-        verdict.holdClock = wasHoldTimeExceeded ? HoldClock::Dropped : HoldClock::Before;
+        verdict.holdClock = _wasHoldTimeExceeded ? HoldClock::Dropped : HoldClock::Before;
     }
 
     // The first that applies wins; the order is the order in which the event is chosen.
     Transition& t = verdict.transition;
-    if (touching && !wasTouching) {
+    if (_touching && !_wasTouching) {
         t = Transition::TouchBegan;
-    } else if (holding && !wasHolding) {
-        t = wasHoldSuppressed ? Transition::HoldRecovered : Transition::HoldBegan;
-    } else if (holding && previousActiveRegion != activeRegion) {
+    } else if (_holding && !_wasHolding) {
+        t = _wasHoldSuppressed ? Transition::HoldRecovered : Transition::HoldBegan;
+    } else if (_holding && previousActiveRegion != activeRegion) {
         t = Transition::HoldMoved;
-    } else if (!holding && wasHolding) {
+    } else if (!_holding && _wasHolding) {
         t = Transition::HoldEnded;
-    } else if (tapDetected) {
+    } else if (_tapDetected) {
         t = Transition::TapAccepted;
-    } else if (!touching && wasTouching) {
-        t = tapCandidate ? Transition::TapRejected : Transition::TouchEnded;
-    } else if (holding) {
+    } else if (!_touching && _wasTouching) {
+        t = _tapCandidate ? Transition::TapRejected : Transition::TouchEnded;
+    } else if (_holding) {
         t = Transition::Holding;
-    } else if (touching) {
+    } else if (_touching) {
         t = Transition::Touching;
     } else {
         t = Transition::Idle;
@@ -208,7 +208,7 @@ void HandStats::updateTouchScore(std::span<const Pixel> pixels, std::span<const 
     // 1.
     svm.updateSVMScore(pixels, virtualPixels, ActivationThreshold);
     // 2. Noise that returns right after ending keeps part of the score.
-    if (isAboveNoise && !wasAboveNoise && touchScore != 0.0f) decayTouchScore(time);
+    if (_isAboveNoise && !_wasAboveNoise && touchScore != 0.0f) decayTouchScore(time);
     // 3.
     touchScore += svm.score;
     // 4.
@@ -359,7 +359,7 @@ void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<cons
                2.4116f;
 
     // 7. Deliberately unequal comparisons: <= for strengthPerDuration, < for the rest.
-    isTapRejected = strengthPerDuration <= 0.0f || strengthRate < 0.0f || nonActive > 21 || durationRatio < 0.0f ||
+    _isTapRejected = strengthPerDuration <= 0.0f || strengthRate < 0.0f || nonActive > 21 || durationRatio < 0.0f ||
                     tapScore < 0.0f;
 }
 

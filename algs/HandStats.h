@@ -3,10 +3,10 @@
 // touched, whether the touch is a hold (or a suppressed one) and whether a touch that just ended
 // is a tap; keeps the running touch score, the edge times of the touch and the active region.
 
+#include <array>
 #include <cstdint>
 #include <span>
 #include <utility>
-#include <vector>
 
 #include "algs/Pixel.h"
 #include "algs/SVM.h"
@@ -63,19 +63,6 @@ public:
     float peakStrength = 0.0f;               // maxOnStrength x ActivationThreshold
     bool EnableHoldSuppression = true;
     bool EnableTapSuppression = true;
-    bool touching = false;
-    bool wasTouching = false;
-    bool isAboveNoise = false;
-    bool wasAboveNoise = false;
-    bool holding = false;
-    bool wasHolding = false;
-    bool isHoldSuppressed = false;
-    bool wasHoldSuppressed = false;
-    bool tapCandidate = false;   // a touch ended this frame within the hold timeout
-    bool tapDetected = false;    // ... and was not rejected
-    bool isTapRejected = false;  // the tap rejection's verdict
-    bool holdTimeExceeded = false;
-    bool wasHoldTimeExceeded = false;
     uint32_t touchStartTime = 0;
     uint32_t touchEndTime = 0;
     uint32_t noiseStartTime = 0;
@@ -91,8 +78,39 @@ public:
     PixelRegion eventRegion = PixelRegion::None;           // at the last tap or hold end
     float maxOnStrength = 0.0f;  // strongest on element since the last Reset, floored at 0
     int32_t maxOnIndex = 0;
-    std::vector<float> regionMax = std::vector<float>(4, 0.0f);  // per region, largest value - 75
+    std::array<float, 4> regionMax{};  // per region, largest value - 75
     float regionSwitchFactor = 1.3f;
+
+    // The state flags, this frame's and the last's. Only the state machine sets them; what a frame
+    // did is read from verdict(), and these accessors are for inspection.
+    bool touching() const { return _touching; }
+    bool wasTouching() const { return _wasTouching; }
+    bool isAboveNoise() const { return _isAboveNoise; }
+    bool wasAboveNoise() const { return _wasAboveNoise; }
+    bool holding() const { return _holding; }
+    bool wasHolding() const { return _wasHolding; }
+    bool isHoldSuppressed() const { return _isHoldSuppressed; }
+    bool wasHoldSuppressed() const { return _wasHoldSuppressed; }
+    bool tapCandidate() const { return _tapCandidate; }
+    bool tapDetected() const { return _tapDetected; }
+    bool isTapRejected() const { return _isTapRejected; }
+    bool holdTimeExceeded() const { return _holdTimeExceeded; }
+    bool wasHoldTimeExceeded() const { return _wasHoldTimeExceeded; }
+
+private:
+    bool _touching = false;
+    bool _wasTouching = false;
+    bool _isAboveNoise = false;
+    bool _wasAboveNoise = false;
+    bool _holding = false;
+    bool _wasHolding = false;
+    bool _isHoldSuppressed = false;
+    bool _wasHoldSuppressed = false;
+    bool _tapCandidate = false;   // a touch ended this frame within the hold timeout
+    bool _tapDetected = false;    // ... and was not rejected
+    bool _isTapRejected = false;  // the tap rejection's verdict
+    bool _holdTimeExceeded = false;
+    bool _wasHoldTimeExceeded = false;
 };
 
 }  // namespace TolkaTouch

@@ -1,8 +1,8 @@
 #include "algs/SVM.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
+#include <cstdint>
 #include <functional>
 #include <stdexcept>
 
@@ -17,7 +17,7 @@ struct Rank {
 };
 
 // Rank 0 is the strongest element. The weights change sign irregularly; they are trained values.
-constexpr std::array<Rank, 38> kRanks{{
+constexpr std::array<Rank, SVM::kRankCount> kRanks{{
     {559.2485f, 319.631f, 2.0791f},  {458.1396f, 264.2479f, 0.577f},   {409.6764f, 238.355f, -0.0003f},
     {376.5288f, 222.3886f, 1.7971f}, {339.7854f, 211.1872f, 0.8896f},  {302.5308f, 206.0873f, -0.194f},
     {281.1469f, 198.0056f, -1.7877f}, {258.9062f, 189.2092f, 1.9933f}, {234.2004f, 182.5528f, 0.5968f},
@@ -33,18 +33,37 @@ constexpr std::array<Rank, 38> kRanks{{
     {3.7211f, 11.7617f, 0.0877f},    {2.1581f, 10.0508f, -0.2101f},
 }};
 
-constexpr size_t kRankCount = kRanks.size();
+constexpr size_t kRankCount = SVM::kRankCount;
+
+// The score's arithmetic in two machine variants picked once at load time: one for processors with
+// a fused multiply-add instruction and wide vectors, one for the rest. Both give the same bits: every
+// step is a single correctly rounded IEEE operation (subtract, divide, fused multiply-add), whichever
+// instructions carry it out.
+#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__)
+#define TOLKA_SCORE_VARIANTS __attribute__((target_clones("arch=x86-64-v3", "default")))
+#else
+#define TOLKA_SCORE_VARIANTS
+#endif
+
+// One fused multiply-add per rank, strongest first, onto the bias-free score.
+TOLKA_SCORE_VARIANTS
+float scoreOfRanked(const int32_t* ranked, const float* means, const float* scales, const float* weights) {
+    std::array<float, kRankCount> standardized;
+    for (size_t i = 0; i < kRankCount; ++i) standardized[i] = (static_cast<float>(ranked[i]) - means[i]) / scales[i];
+    float score = 0.0f;
+    for (size_t i = 0; i < kRankCount; ++i) score = std::fma(standardized[i], weights[i], score);
+    return score;
+}
+
+#undef TOLKA_SCORE_VARIANTS
 
 }  // namespace
 
 SVM::SVM() {
-    means.reserve(kRankCount);
-    scales.reserve(kRankCount);
-    weights.reserve(kRankCount);
-    for (const auto& rank : kRanks) {
-        means.push_back(rank.mean);
-        scales.push_back(rank.scale);
-        weights.push_back(rank.weight);
+    for (size_t i = 0; i < kRankCount; ++i) {
+        means[i] = kRanks[i].mean;
+        scales[i] = kRanks[i].scale;
+        weights[i] = kRanks[i].weight;
     }
 }
 
@@ -54,41 +73,36 @@ void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualP
     score = 0.0f;
 
     // 2. One list of every element's value: real pixels, then virtual ones. Only the values enter
-    // the score, so the list holds just those; with the fixed groups it fits on the stack.
+    // the score, so the list holds just those.
     const size_t count = pixels.size() + virtualPixels.size();
-    std::array<int32_t, kRankCount> fixed;
-    std::vector<int32_t> spill;
-    int32_t* ranked = fixed.data();
-    if (count > fixed.size()) {
-        spill.resize(count);
-        ranked = spill.data();
-    }
+    if (count < 2 || count > kRankCount) throw std::out_of_range("vector");
+    std::array<int32_t, kRankCount> values;
     size_t n = 0;
-    for (const Pixel& p : pixels) ranked[n++] = p.value;
-    for (const VirtualPixel& p : virtualPixels) ranked[n++] = p.value;
-    if (count < 2) throw std::out_of_range("vector");
+    for (const Pixel& p : pixels) values[n++] = p.value;
+    for (const VirtualPixel& p : virtualPixels) values[n++] = p.value;
 
     // 4. Gate first: it needs only ranks 0 and 1, so a quiet frame is not scored (the bias is not
-    // added either) and skips the sort.
-    int32_t rank0 = std::max(ranked[0], ranked[1]);
-    int32_t rank1 = std::min(ranked[0], ranked[1]);
+    // added either) and skips the ranking.
+    int32_t rank0 = std::max(values[0], values[1]);
+    int32_t rank1 = std::min(values[0], values[1]);
     for (size_t i = 2; i < count; ++i) {
-        if (ranked[i] > rank0) {
-            rank1 = rank0;
-            rank0 = ranked[i];
-        } else if (ranked[i] > rank1) {
-            rank1 = ranked[i];
-        }
+        rank1 = std::max(rank1, std::min(rank0, values[i]));
+        rank0 = std::max(rank0, values[i]);
     }
     if (!(static_cast<float>(rank0) > gate) && rank1 < Pixel::kNoiseLevel + 1) return;
 
-    // 3. Largest first; equal values are interchangeable here.
-    std::sort(ranked, ranked + count, std::greater<int32_t>());
-
-    // 5. One fused multiply-add per rank, strongest first.
-    for (size_t i = 0; i < count; ++i) {
-        const float standardized = (static_cast<float>(ranked[i]) - means.at(i)) / scales.at(i);
-        score = std::fma(standardized, weights.at(i), score);
+    if (count == kRankCount) {
+        // 3., 5. The surface's 38 elements.
+        // 3. Largest first; equal values are interchangeable here. A sort of 38 in place: one
+        // partition, then insertion runs, no allocation.
+        std::sort(values.begin(), values.end(), std::greater<int32_t>());
+        score = scoreOfRanked(values.data(), means.data(), scales.data(), weights.data());
+    } else {
+        // Fewer elements than ranks: the first `count` ranks, in the same order of operations.
+        std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(count), std::greater<int32_t>());
+        for (size_t i = 0; i < count; ++i) {
+            score = std::fma((static_cast<float>(values[i]) - means[i]) / scales[i], weights[i], score);
+        }
     }
 
     // 6.

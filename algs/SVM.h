@@ -2,8 +2,9 @@
 // SVM: the tap classifier. A fixed linear classifier over the rank-ordered values of the 15 real
 // and 23 virtual pixels that scores how much one frame looks like a deliberate touch.
 
+#include <array>
+#include <cstddef>
 #include <span>
-#include <vector>
 
 #include "algs/Pixel.h"
 #include "algs/VirtualPixel.h"
@@ -12,17 +13,21 @@ namespace TolkaTouch {
 
 class SVM {
 public:
+    // One rank per element: 15 real and 23 virtual pixels.
+    static constexpr size_t kRankCount = 38;
+
     SVM();
 
     // This frame's score; 0 for a quiet frame (nothing above gate and nothing else above noise).
+    // Throws std::out_of_range("vector") unless the two lists hold between 2 and 38 elements.
     void updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                         float gate);
     float getSVMScore() const { return score; }
 
     float score = 0.0f;
-    std::vector<float> means;    // per rank, subtracted
-    std::vector<float> scales;   // per rank, divided by
-    std::vector<float> weights;  // per rank
+    std::array<float, kRankCount> means;    // per rank, subtracted
+    std::array<float, kRankCount> scales;   // per rank, divided by
+    std::array<float, kRankCount> weights;  // per rank
     float bias = 2.0083f;
 };
 

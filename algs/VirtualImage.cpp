@@ -76,20 +76,23 @@ void VirtualImage::updateValues(std::span<const Pixel> pixels) {
     // 1. Sums start afresh; the strongest members carry over from the last frame.
     std::fill(values.begin(), values.end(), 0);
 
-    // The surface's own 15 pixels and the fixed groups: the members were looked up once.
+    // The surface's own 15 pixels and the fixed groups: the members were looked up once, and the
+    // pixels' values are read into one row first.
     if (pixels.size() == kPixelCount && groups.size() == kGroups.size() && values.size() == kGroups.size() &&
         strongest.size() == kGroups.size()) {
+        std::array<int32_t, kPixelCount> pixelValue;
+        for (size_t i = 0; i < kPixelCount; ++i) pixelValue[i] = pixels[i].value;
         for (size_t g = 0; g < kGroups.size(); ++g) {
             const GroupMembers& members = kMembers[g];
             int32_t sum = 0;
             int32_t strongestIndex = strongest[g];
             for (size_t m = 0; m < members.count; ++m) {
                 const size_t i = members.index[m];
-                const int32_t v = pixels[i].value;
+                const int32_t v = pixelValue[i];
                 if (v >= Pixel::kNoiseLevel + 1) {
                     sum += v;
                     if (static_cast<size_t>(strongestIndex) >= kPixelCount) throw std::out_of_range("vector");
-                    if (v > pixels[static_cast<size_t>(strongestIndex)].value) strongestIndex = static_cast<int32_t>(i);
+                    if (v > pixelValue[static_cast<size_t>(strongestIndex)]) strongestIndex = static_cast<int32_t>(i);
                 }
             }
             values[g] = sum;

@@ -186,11 +186,11 @@ TEST_F(AlgsTest, FirmwareResetFrameDuringAHoldEndsItWithFrameNumberZero) {
     TouchScript script(algs);
     script.touch("CD", 600, 1016, 3000);
     ASSERT_EQ(script.playUntil(1600).size(), 2u);
-    ASSERT_TRUE(algs.handStats.holding);
+    ASSERT_TRUE(algs.handStats.holding());
     const EventList events = algs.handleReset();
     ASSERT_EQ(events.size(), 1u);
     EXPECT_EQ(Testing::recordOf(*events[0]), holdEnd(1, 0));
-    EXPECT_FALSE(algs.handStats.holding);
+    EXPECT_FALSE(algs.handStats.holding());
     EXPECT_EQ(algs.handStats.touchEndTime, 0u);
 }
 
@@ -405,7 +405,7 @@ TEST_F(AlgsTest, RaisedActivationThresholdEndsAFirmTouchOnTheNextFrame) {
     EXPECT_EQ(script.playUntil(1200), (Events{mayBegin(1, script.frameAt(1016))}));
     algs.setState("ActivationThreshold", PropertyValue(1000.0));
     EXPECT_EQ(script.playUntil(1208), (Events{tap(1, script.frameAt(1208))}));
-    EXPECT_FALSE(algs.handStats.touching);
+    EXPECT_FALSE(algs.handStats.touching());
 }
 
 TEST_F(AlgsTest, WithoutTapSuppressionALightBrushIsATap) {

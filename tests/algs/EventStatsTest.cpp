@@ -5,7 +5,7 @@
 #include <map>
 #include <string>
 
-#include "algs/HandStats.h"
+#include "tolkatouch/FrameSnapshot.h"
 
 namespace TolkaTouch {
 namespace {
@@ -24,11 +24,18 @@ Counts nonZeroCounts(const EventStats& stats) {
     return counts;
 }
 
-HandStats handIn(PixelRegion region) {
-    HandStats hand;
-    hand.activeRegion = region;
-    return hand;
+// One frame's verdict as the hand state machine would leave it.
+FrameVerdict frame(Transition transition, PixelRegion region, HoldClock clock = HoldClock::Before,
+                   bool holdSuppressed = false) {
+    FrameVerdict verdict;
+    verdict.transition = transition;
+    verdict.region = region;
+    verdict.holdClock = clock;
+    verdict.holdSuppressed = holdSuppressed;
+    return verdict;
 }
+
+constexpr bool kSuppressed = true;
 
 TEST(EventStatsTest, AllTwentyFourCountersStartAtZero) {
     const EventStats stats;
@@ -62,47 +69,27 @@ TEST(EventStatsTest, StatsDictionaryHoldsTwelveUnsignedCountersUnderEachHalf) {
 
 TEST(EventStatsTest, AcceptedTapInRegionThreeAddsOneToNumTapsAndNumVolumeUpOnly) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::VolumeUp);
-    hand.wasTouching = true;
-    hand.tapCandidate = true;
-    hand.tapDetected = true;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::TapAccepted, PixelRegion::VolumeUp));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numTaps", 1}, {"numVolumeUp", 1}}));
 }
 
 TEST(EventStatsTest, AcceptedTapsInRegionsOneAndTwoCountPlayPauseAndVolumeDown) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::PlayPause);
-    hand.wasTouching = true;
-    hand.tapCandidate = true;
-    hand.tapDetected = true;
-    stats.update(hand.verdict());
-    hand.activeRegion = PixelRegion::VolumeDown;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::TapAccepted, PixelRegion::PlayPause));
+    stats.update(frame(Transition::TapAccepted, PixelRegion::VolumeDown));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numTaps", 2}, {"numPlayPause", 1}, {"numVolumeDown", 1}}));
 }
 
 TEST(EventStatsTest, HoldInRegionOneHeldForFiveFramesCountsOneBeginFourIncrementsAndOneEnd) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::PlayPause);
-    hand.touching = true;  // the touch starts: nothing counted
-    stats.update(hand.verdict());
-    hand.wasTouching = true;
-    hand.touching = true;
-    stats.update(hand.verdict());  // touching, not yet holding: nothing counted
-    hand.holding = true;
-    hand.holdTimeExceeded = true;
-    stats.update(hand.verdict());
-    hand.wasHolding = true;
-    hand.wasHoldTimeExceeded = true;
-    for (int i = 0; i < 4; ++i) stats.update(hand.verdict());
+    stats.update(frame(Transition::TouchBegan, PixelRegion::PlayPause));  // the touch starts: nothing counted
+    stats.update(frame(Transition::Touching, PixelRegion::PlayPause));    // not yet holding: nothing counted
+    stats.update(frame(Transition::HoldBegan, PixelRegion::PlayPause, HoldClock::Reached));
+    for (int i = 0; i < 4; ++i) stats.update(frame(Transition::Holding, PixelRegion::PlayPause, HoldClock::Past));
     EXPECT_EQ(nonZeroCounts(stats),
               (Counts{{"numBeginHold", 1}, {"numKalioCall", 1}, {"numIncrementHold", 4}, {"numKalioCallIncrement", 4}}));
 
-    hand.touching = false;
-    hand.holding = false;
-    hand.holdTimeExceeded = false;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::HoldEnded, PixelRegion::PlayPause, HoldClock::Dropped));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numBeginHold", 1},
                                             {"numKalioCall", 1},
                                             {"numIncrementHold", 4},
@@ -112,14 +99,9 @@ TEST(EventStatsTest, HoldInRegionOneHeldForFiveFramesCountsOneBeginFourIncrement
 
 TEST(EventStatsTest, HoldsInRegionsTwoAndThreeCountVolumeDecrementAndIncrementEveryFrame) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::VolumeDown);
-    hand.wasTouching = hand.touching = true;
-    hand.holding = true;
-    stats.update(hand.verdict());
-    hand.wasHolding = true;
-    stats.update(hand.verdict());
-    hand.activeRegion = PixelRegion::VolumeUp;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::HoldBegan, PixelRegion::VolumeDown));
+    stats.update(frame(Transition::Holding, PixelRegion::VolumeDown));
+    stats.update(frame(Transition::HoldMoved, PixelRegion::VolumeUp));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numBeginHold", 1},
                                             {"numIncrementHold", 2},
                                             {"numVolumeDecrement", 2},
@@ -128,29 +110,18 @@ TEST(EventStatsTest, HoldsInRegionsTwoAndThreeCountVolumeDecrementAndIncrementEv
 
 TEST(EventStatsTest, HoldAfterASuppressedOneCountsSuppressedToHolding) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::PlayPause);
-    hand.wasTouching = hand.touching = true;
-    hand.holding = true;
-    hand.wasHoldSuppressed = true;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::HoldRecovered, PixelRegion::PlayPause));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numSuppressed2Holding", 1}, {"numBeginHold", 1}, {"numKalioCall", 1}}));
 }
 
 TEST(EventStatsTest, HoldSuppressedInTheFrameTheTimeoutPassesCountsARejectedBegin) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::PlayPause);
-    hand.wasTouching = hand.touching = true;
-    hand.isHoldSuppressed = true;
-    hand.holdTimeExceeded = true;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::Touching, PixelRegion::PlayPause, HoldClock::Reached, kSuppressed));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedBeginHold", 1}, {"numRejectedKalioCall", 1}}));
 
-    hand.wasHoldTimeExceeded = true;
-    stats.update(hand.verdict());
-    hand.activeRegion = PixelRegion::VolumeDown;
-    stats.update(hand.verdict());
-    hand.activeRegion = PixelRegion::VolumeUp;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::Touching, PixelRegion::PlayPause, HoldClock::Past, kSuppressed));
+    stats.update(frame(Transition::Touching, PixelRegion::VolumeDown, HoldClock::Past, kSuppressed));
+    stats.update(frame(Transition::Touching, PixelRegion::VolumeUp, HoldClock::Past, kSuppressed));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedBeginHold", 1},
                                             {"numRejectedKalioCall", 1},
                                             {"numRejectedIncrementHold", 3},
@@ -161,44 +132,37 @@ TEST(EventStatsTest, HoldSuppressedInTheFrameTheTimeoutPassesCountsARejectedBegi
 
 TEST(EventStatsTest, SuppressedWithoutTheTimeoutCountsOnlyTheVolumeButtons) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::VolumeDown);
-    hand.wasTouching = hand.touching = true;
-    hand.isHoldSuppressed = true;
-    hand.wasHolding = true;
-    stats.update(hand.verdict());
-    hand.activeRegion = PixelRegion::PlayPause;
-    stats.update(hand.verdict());
+    // A hold that ends under a finger that stays, suppressed, short of the timeout.
+    stats.update(frame(Transition::HoldEnded, PixelRegion::VolumeDown, HoldClock::Before, kSuppressed));
+    stats.update(frame(Transition::HoldEnded, PixelRegion::PlayPause, HoldClock::Before, kSuppressed));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numHolding2Suppressed", 2}, {"numRejectedVolumeDecrement", 1}}));
 }
 
 TEST(EventStatsTest, SuppressedHoldThatEndsCountsARejectedEnd) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::PlayPause);
-    hand.wasTouching = true;
-    hand.wasHoldTimeExceeded = true;
-    hand.tapCandidate = true;  // not reached
-    stats.update(hand.verdict());
+    // The dropped hold clock decides before the tap's outcome is looked at.
+    stats.update(frame(Transition::TapRejected, PixelRegion::PlayPause, HoldClock::Dropped));
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedEndHold", 1}}));
 }
 
 TEST(EventStatsTest, RejectedTapCountsTheRejectedButton) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::VolumeDown);
-    hand.wasTouching = true;
-    hand.tapCandidate = true;
-    stats.update(hand.verdict());
-    hand.activeRegion = PixelRegion::None;  // region 0: the general counter only
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::TapRejected, PixelRegion::VolumeDown));
+    stats.update(frame(Transition::TapRejected, PixelRegion::None));  // region 0: the general counter only
     EXPECT_EQ(nonZeroCounts(stats), (Counts{{"numRejectedTap", 2}, {"numRejectedVolumeDown", 1}}));
 }
 
 TEST(EventStatsTest, NothingIsCountedInTheFrameATouchStarts) {
     EventStats stats;
-    HandStats hand = handIn(PixelRegion::PlayPause);
-    hand.touching = true;
-    hand.holding = true;
-    hand.tapDetected = true;
-    stats.update(hand.verdict());
+    stats.update(frame(Transition::TouchBegan, PixelRegion::PlayPause, HoldClock::Reached, kSuppressed));
+    EXPECT_EQ(nonZeroCounts(stats), Counts{});
+}
+
+TEST(EventStatsTest, EndedTouchAndIdleFramesCountNothing) {
+    EventStats stats;
+    stats.update(frame(Transition::TouchEnded, PixelRegion::VolumeUp));
+    stats.update(frame(Transition::Idle, PixelRegion::VolumeUp));
+    stats.update(frame(Transition::Touching, PixelRegion::VolumeUp));
     EXPECT_EQ(nonZeroCounts(stats), Counts{});
 }
 

@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
+
 #include <limits>
 #include <stdexcept>
 
@@ -52,7 +54,7 @@ TEST(HandStatsTest, ConstructorSetsTheDefaults) {
     EXPECT_EQ(hand.scoreLimit, 100.0f);
     EXPECT_TRUE(hand.EnableHoldSuppression);
     EXPECT_TRUE(hand.EnableTapSuppression);
-    EXPECT_EQ(hand.regionMax, std::vector<float>(4, 0.0f));
+    EXPECT_EQ(hand.regionMax, (std::array<float, 4>{}));
     EXPECT_EQ(hand.regionSwitchFactor, 1.3f);
     EXPECT_EQ(hand.activeRegion, PixelRegion::None);
 }
@@ -67,7 +69,7 @@ TEST(HandStatsTest, ResetClearsOnlyTheScoreAndTheStrongestOnRecord) {
     EXPECT_EQ(hand.peakStrength, 0.0f);
     EXPECT_EQ(hand.maxOnStrength, 0.0f);
     EXPECT_EQ(hand.maxOnIndex, 0);
-    EXPECT_TRUE(hand.touching);
+    EXPECT_TRUE(hand.touching());
     EXPECT_EQ(hand.touchStartTime, 1000u);
     EXPECT_EQ(hand.activeRegion, PixelRegion::PlayPause);
 }
@@ -96,8 +98,8 @@ TEST(HandStatsTest, TouchLastingExactlyFiveHundredMillisecondsIsNotAHold) {
     const HandFrame frame = HandFrame().on(2, 3.0f);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1500);
-    EXPECT_FALSE(hand.holding);
-    EXPECT_FALSE(hand.holdTimeExceeded);
+    EXPECT_FALSE(hand.holding());
+    EXPECT_FALSE(hand.holdTimeExceeded());
 }
 
 TEST(HandStatsTest, TouchLastingFiveHundredAndOneMillisecondsIsAHold) {
@@ -105,9 +107,9 @@ TEST(HandStatsTest, TouchLastingFiveHundredAndOneMillisecondsIsAHold) {
     const HandFrame frame = HandFrame().on(2, 3.0f);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
-    EXPECT_TRUE(hand.holding);
-    EXPECT_TRUE(hand.holdTimeExceeded);
-    EXPECT_FALSE(hand.isHoldSuppressed);
+    EXPECT_TRUE(hand.holding());
+    EXPECT_TRUE(hand.holdTimeExceeded());
+    EXPECT_FALSE(hand.isHoldSuppressed());
 }
 
 TEST(HandStatsTest, ScoreExactlyZeroAtTheTimeoutWithThresholdZeroBecomesAHold) {
@@ -116,8 +118,8 @@ TEST(HandStatsTest, ScoreExactlyZeroAtTheTimeoutWithThresholdZeroBecomesAHold) {
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
     ASSERT_EQ(hand.touchScore, 0.0f);
-    EXPECT_TRUE(hand.holding);
-    EXPECT_FALSE(hand.isHoldSuppressed);
+    EXPECT_TRUE(hand.holding());
+    EXPECT_FALSE(hand.isHoldSuppressed());
 }
 
 TEST(HandStatsTest, ScoreBelowTheThresholdAtTheTimeoutSuppressesTheHold) {
@@ -126,14 +128,14 @@ TEST(HandStatsTest, ScoreBelowTheThresholdAtTheTimeoutSuppressesTheHold) {
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.touchScore = -0.5f;
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
-    EXPECT_FALSE(hand.holding);
-    EXPECT_TRUE(hand.isHoldSuppressed);
-    EXPECT_TRUE(hand.holdTimeExceeded);
+    EXPECT_FALSE(hand.holding());
+    EXPECT_TRUE(hand.isHoldSuppressed());
+    EXPECT_TRUE(hand.holdTimeExceeded());
 
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1509);
-    EXPECT_FALSE(hand.holding);
-    EXPECT_TRUE(hand.isHoldSuppressed);
-    EXPECT_TRUE(hand.wasHoldSuppressed);
+    EXPECT_FALSE(hand.holding());
+    EXPECT_TRUE(hand.isHoldSuppressed());
+    EXPECT_TRUE(hand.wasHoldSuppressed());
 }
 
 TEST(HandStatsTest, SuppressedTouchWhoseScoreRecoversBecomesAHold) {
@@ -142,12 +144,12 @@ TEST(HandStatsTest, SuppressedTouchWhoseScoreRecoversBecomesAHold) {
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.touchScore = -0.5f;
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
-    ASSERT_TRUE(hand.isHoldSuppressed);
+    ASSERT_TRUE(hand.isHoldSuppressed());
     hand.touchScore = 0.5f;
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1509);
-    EXPECT_TRUE(hand.holding);
-    EXPECT_FALSE(hand.isHoldSuppressed);
-    EXPECT_TRUE(hand.wasHoldSuppressed);
+    EXPECT_TRUE(hand.holding());
+    EXPECT_FALSE(hand.isHoldSuppressed());
+    EXPECT_TRUE(hand.wasHoldSuppressed());
 }
 
 TEST(HandStatsTest, HeldTouchWhoseScoreFallsBelowTheThresholdStaysHeld) {
@@ -155,12 +157,12 @@ TEST(HandStatsTest, HeldTouchWhoseScoreFallsBelowTheThresholdStaysHeld) {
     const HandFrame frame = HandFrame().onWithoutValue(2);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
-    ASSERT_TRUE(hand.holding);
+    ASSERT_TRUE(hand.holding());
     hand.touchScore = -50.0f;
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1509);
-    EXPECT_TRUE(hand.holding);
-    EXPECT_TRUE(hand.wasHolding);
-    EXPECT_FALSE(hand.isHoldSuppressed);
+    EXPECT_TRUE(hand.holding());
+    EXPECT_TRUE(hand.wasHolding());
+    EXPECT_FALSE(hand.isHoldSuppressed());
 }
 
 TEST(HandStatsTest, TouchReleasedInTheFirstFrameAfterPassingTheTimeoutIsNotATap) {
@@ -169,10 +171,10 @@ TEST(HandStatsTest, TouchReleasedInTheFirstFrameAfterPassingTheTimeoutIsNotATap)
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
     hand.updateHandState(kIdle.pixels, kIdle.virtualPixels, 1509);
-    EXPECT_FALSE(hand.tapCandidate);
-    EXPECT_FALSE(hand.tapDetected);
-    EXPECT_TRUE(hand.wasHolding);
-    EXPECT_FALSE(hand.holding);
+    EXPECT_FALSE(hand.tapCandidate());
+    EXPECT_FALSE(hand.tapDetected());
+    EXPECT_TRUE(hand.wasHolding());
+    EXPECT_FALSE(hand.holding());
 }
 
 TEST(HandStatsTest, TouchReleasedPastTheTimeoutIsATapWhenItsLastFrameHadNotPassedIt) {
@@ -181,7 +183,7 @@ TEST(HandStatsTest, TouchReleasedPastTheTimeoutIsATapWhenItsLastFrameHadNotPasse
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1500);
     hand.updateHandState(kIdle.pixels, kIdle.virtualPixels, 1508);
-    EXPECT_TRUE(hand.tapCandidate);
+    EXPECT_TRUE(hand.tapCandidate());
     EXPECT_EQ(hand.touchEndTime, 1508u);
 }
 
@@ -266,10 +268,10 @@ TEST(HandStatsTest, WithoutHoldSuppressionEveryTouchEndCountsAsATapAlsoAfterAHol
     const HandFrame frame = HandFrame().on(2, 3.0f);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1501);
-    ASSERT_TRUE(hand.holding);
+    ASSERT_TRUE(hand.holding());
     hand.updateHandState(kIdle.pixels, kIdle.virtualPixels, 1509);
-    EXPECT_FALSE(hand.holding);
-    EXPECT_TRUE(hand.tapCandidate);
+    EXPECT_FALSE(hand.holding());
+    EXPECT_TRUE(hand.tapCandidate());
 }
 
 TEST(HandStatsTest, WithoutTapSuppressionARejectedTouchEndStillCountsAsATap) {
@@ -278,9 +280,9 @@ TEST(HandStatsTest, WithoutTapSuppressionARejectedTouchEndStillCountsAsATap) {
     const HandFrame frame = HandFrame().on(2, 3.0f);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(kIdle.pixels, kIdle.virtualPixels, 1000);  // duration 0: rejected
-    EXPECT_TRUE(hand.isTapRejected);
-    EXPECT_TRUE(hand.tapCandidate);
-    EXPECT_TRUE(hand.tapDetected);
+    EXPECT_TRUE(hand.isTapRejected());
+    EXPECT_TRUE(hand.tapCandidate());
+    EXPECT_TRUE(hand.tapDetected());
     EXPECT_EQ(hand.lastEventTime, 1000u);
     EXPECT_EQ(hand.eventRegion, PixelRegion::PlayPause);
 }
@@ -291,7 +293,7 @@ TEST(HandStatsTest, AcceptedTapRecordsTheEventTimeAndRegion) {
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1000);
     hand.updateHandState(frame.pixels, frame.virtualPixels, 1080);
     hand.updateHandState(kIdle.pixels, kIdle.virtualPixels, 1088);
-    EXPECT_TRUE(hand.tapDetected);
+    EXPECT_TRUE(hand.tapDetected());
     EXPECT_EQ(hand.lastEventTime, 1088u);
     EXPECT_EQ(hand.eventRegion, PixelRegion::VolumeUp);
 }
@@ -306,7 +308,7 @@ TEST(HandStatsTest, PixelsAtOrBelowNoiseLeaveRegionMaxAtZero) {
     frame.pixels[12].value = -300;
     hand.regionMax = {9.0f, 9.0f, 9.0f, 9.0f};
     hand.updateRegionMax(frame.pixels);
-    EXPECT_EQ(hand.regionMax, std::vector<float>(4, 0.0f));
+    EXPECT_EQ(hand.regionMax, (std::array<float, 4>{}));
 }
 
 TEST(HandStatsTest, RegionMaxKeepsEachRegionsLargestExcessOverNoiseAndNeverWritesRegionZero) {
@@ -319,7 +321,7 @@ TEST(HandStatsTest, RegionMaxKeepsEachRegionsLargestExcessOverNoiseAndNeverWrite
     frame.pixels[14].index = 15;  // no region
     frame.pixels[14].value = 900;
     hand.updateRegionMax(frame.pixels);
-    EXPECT_EQ(hand.regionMax, (std::vector<float>{0.0f, 225.0f, 5.0f, 101.0f}));
+    EXPECT_EQ(hand.regionMax, (std::array<float, 4>{0.0f, 225.0f, 5.0f, 101.0f}));
 }
 
 TEST(HandStatsTest, TouchWithDurationZeroLeavesStrengthPerDurationZeroAndIsRejected) {
@@ -334,7 +336,7 @@ TEST(HandStatsTest, TouchWithDurationZeroLeavesStrengthPerDurationZeroAndIsRejec
     EXPECT_EQ(hand.peakStrength, 600.0f);
     EXPECT_EQ(hand.strengthRate, 600.0f / 10.0f - 0.51f);
     EXPECT_EQ(hand.durationRatio, -0.25f);
-    EXPECT_TRUE(hand.isTapRejected);
+    EXPECT_TRUE(hand.isTapRejected());
 }
 
 TEST(HandStatsTest, TapFeaturesAndScoreOfAnOrdinaryTap) {
@@ -350,7 +352,7 @@ TEST(HandStatsTest, TapFeaturesAndScoreOfAnOrdinaryTap) {
     EXPECT_EQ(hand.durationRatio, 0.75f);
     EXPECT_EQ(hand.activePixelCount, 21);
     EXPECT_EQ(hand.tapScore, 0.1886f * 21.0f + 0.2772f * (6.0f - 0.51f) + 2.7205f * 0.75f - 2.4116f);
-    EXPECT_FALSE(hand.isTapRejected);
+    EXPECT_FALSE(hand.isTapRejected());
 }
 
 TEST(HandStatsTest, SpanIsTheShorterOfTheTimesSinceNoiseStartAndSinceTheLastEvent) {
@@ -377,7 +379,7 @@ TEST(HandStatsTest, StrengthRateAndDurationRatioOfExactlyZeroLeaveTheTapStanding
     EXPECT_EQ(hand.durationRatio, 0.0f);
     EXPECT_GT(hand.strengthPerDuration, 0.0f);
     EXPECT_GT(hand.tapScore, 0.0f);
-    EXPECT_FALSE(hand.isTapRejected);
+    EXPECT_FALSE(hand.isTapRejected());
 }
 
 TEST(HandStatsTest, StrengthPerDurationOfExactlyZeroRejectsTheTap) {
@@ -392,7 +394,7 @@ TEST(HandStatsTest, StrengthPerDurationOfExactlyZeroRejectsTheTap) {
     EXPECT_GT(hand.strengthRate, 0.0f);
     EXPECT_GT(hand.durationRatio, 0.0f);
     EXPECT_GT(hand.tapScore, 0.0f);
-    EXPECT_TRUE(hand.isTapRejected);
+    EXPECT_TRUE(hand.isTapRejected());
 }
 
 // A 100 ms tap of strength `strength` with `count` elements above noise that were never on.
@@ -423,14 +425,14 @@ TEST(HandStatsTest, TwentyTwoNonActivePixelsRejectTheTapWhateverTheScore) {
     EXPECT_GT(hand.strengthRate, 0.0f);
     EXPECT_GT(hand.strengthPerDuration, 0.0f);
     EXPECT_GT(hand.durationRatio, 0.0f);
-    EXPECT_TRUE(hand.isTapRejected);
+    EXPECT_TRUE(hand.isTapRejected());
 }
 
 TEST(HandStatsTest, TwentyOneNonActivePixelsGiveActivePixelCountZero) {
     const HandStats hand = tapWithNonActivePixels(21, 3.0f);
     EXPECT_EQ(hand.activePixelCount, 0);
     EXPECT_EQ(hand.tapScore, 0.1886f * 0.0f + 0.2772f * (6.0f - 0.51f) + 2.7205f * 0.75f - 2.4116f);
-    EXPECT_FALSE(hand.isTapRejected);
+    EXPECT_FALSE(hand.isTapRejected());
 }
 
 std::pair<int, int> twoFirstIndices(std::span<const Pixel> pixels) {
@@ -543,7 +545,7 @@ TEST(HandStatsTest, DuringAHoldWithThePreviousMaximumZeroTheTouchMovesOnceTheCur
     EXPECT_EQ(hand.changeActiveRegion(frame.pixels, 7), PixelRegion::VolumeUp);
     EXPECT_EQ(hand.previousActiveRegion, PixelRegion::VolumeDown);
     EXPECT_EQ(hand.regionSwitchFactor, 1.3f);
-    EXPECT_EQ(hand.regionMax, (std::vector<float>{0.0f, 0.0f, 25.0f, 35.0f}));
+    EXPECT_EQ(hand.regionMax, (std::array<float, 4>{0.0f, 0.0f, 25.0f, 35.0f}));
 }
 
 TEST(HandStatsTest, DuringAHoldTheSameRegionIsKeptWithoutUpdatingRegionMax) {
@@ -553,7 +555,7 @@ TEST(HandStatsTest, DuringAHoldTheSameRegionIsKeptWithoutUpdatingRegionMax) {
     HandFrame frame;
     frame.pixels[12].value = 500;
     EXPECT_EQ(hand.changeActiveRegion(frame.pixels, 12), PixelRegion::VolumeDown);
-    EXPECT_EQ(hand.regionMax, (std::vector<float>{0.0f, 0.0f, 7.0f, 0.0f}));
+    EXPECT_EQ(hand.regionMax, (std::array<float, 4>{0.0f, 0.0f, 7.0f, 0.0f}));
 }
 
 TEST(HandStatsTest, DuringAHoldTheNewRegionMustHaveGrownByTheSwitchFactor) {
