@@ -81,15 +81,16 @@ void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualP
     for (const Pixel& p : pixels) values[n++] = p.value;
     for (const VirtualPixel& p : virtualPixels) values[n++] = p.value;
 
-    // 4. Gate first: it needs only ranks 0 and 1, so a quiet frame is not scored (the bias is not
-    // added either) and skips the ranking.
-    int32_t rank0 = std::max(values[0], values[1]);
-    int32_t rank1 = std::min(values[0], values[1]);
-    for (size_t i = 2; i < count; ++i) {
-        rank1 = std::max(rank1, std::min(rank0, values[i]));
-        rank0 = std::max(rank0, values[i]);
+    // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
+    // sort. Rank 0 above the gate means some value converts above it (the conversion keeps
+    // order); rank 1 at noise or above means two values are.
+    bool aboveGate = false;
+    size_t aboveNoise = 0;
+    for (size_t i = 0; i < count; ++i) {
+        aboveGate |= static_cast<float>(values[i]) > gate;
+        aboveNoise += values[i] >= Pixel::kNoiseLevel + 1;
     }
-    if (!(static_cast<float>(rank0) > gate) && rank1 < Pixel::kNoiseLevel + 1) return;
+    if (!aboveGate && aboveNoise < 2) return;
 
     if (count == kRankCount) {
         // 3., 5. The surface's 38 elements.

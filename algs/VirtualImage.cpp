@@ -24,9 +24,12 @@ constexpr std::array<GroupDefinition, 23> kGroups{{
     {"LMN", 0.4444f},  {"LMO", 0.5714f},  {"MNO", 0.6667f},
 }};
 
-// Each group's member pixels as indices, looked up once from its letters.
+// Each group's member pixels as indices, looked up once from its letters. A group of three has
+// a fourth member kNoMember, whose value always reads 0: below noise, it never counts.
+constexpr uint8_t kNoMember = kPixelCount;
+
 struct GroupMembers {
-    std::array<uint8_t, 4> index{};
+    std::array<uint8_t, 4> index{kNoMember, kNoMember, kNoMember, kNoMember};
     size_t count = 0;
 };
 
@@ -80,23 +83,30 @@ void VirtualImage::updateValues(std::span<const Pixel> pixels) {
     // pixels' values are read into one row first.
     if (pixels.size() == kPixelCount && groups.size() == kGroups.size() && values.size() == kGroups.size() &&
         strongest.size() == kGroups.size()) {
-        std::array<int32_t, kPixelCount> pixelValue;
+        std::array<int32_t, kPixelCount + 1> pixelValue;
         for (size_t i = 0; i < kPixelCount; ++i) pixelValue[i] = pixels[i].value;
+        pixelValue[kNoMember] = 0;
         for (size_t g = 0; g < kGroups.size(); ++g) {
             const GroupMembers& members = kMembers[g];
-            int32_t sum = 0;
-            int32_t strongestIndex = strongest[g];
-            for (size_t m = 0; m < members.count; ++m) {
-                const size_t i = members.index[m];
-                const int32_t v = pixelValue[i];
-                if (v >= Pixel::kNoiseLevel + 1) {
-                    sum += v;
-                    if (static_cast<size_t>(strongestIndex) >= kPixelCount) throw std::out_of_range("vector");
-                    if (v > pixelValue[static_cast<size_t>(strongestIndex)]) strongestIndex = static_cast<int32_t>(i);
+            uint32_t strongestIndex = static_cast<uint32_t>(strongest[g]);
+            if (strongestIndex >= kPixelCount) {
+                // Only a member above noise compares against the recorded strongest.
+                for (const uint8_t i : members.index) {
+                    if (pixelValue[i] >= Pixel::kNoiseLevel + 1) throw std::out_of_range("vector");
                 }
+                values[g] = 0;
+                continue;
+            }
+            // Every group has four slots: the same steps for each, choosing instead of branching.
+            int32_t sum = 0;
+            for (const uint8_t i : members.index) {
+                const int32_t v = pixelValue[i];
+                const bool aboveNoise = v >= Pixel::kNoiseLevel + 1;
+                sum += aboveNoise ? v : 0;
+                strongestIndex = aboveNoise && v > pixelValue[strongestIndex] ? i : strongestIndex;
             }
             values[g] = sum;
-            strongest[g] = strongestIndex;
+            strongest[g] = static_cast<int32_t>(strongestIndex);
         }
         return;
     }
