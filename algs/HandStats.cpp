@@ -68,27 +68,30 @@ void HandStats::updateHandState(std::span<const Pixel> pixels, std::span<const V
                                 unsigned int time) {
     // 1. Scan the real pixels, then the virtual ones: the strongest on element since the last
     // Reset, whether anything is on or above noise, and this frame's strongest element.
+    // Kept in locals and stored once: the pixels are floats too, so stores to members inside the
+    // loop would make every pixel be read again.
     bool someOn = false;
     bool someAboveNoise = false;
     float strongestStrength = 0.0f;
     int32_t strongestIndex = 0;
+    float maxOn = maxOnStrength;
+    int32_t maxOnAt = maxOnIndex;
     const auto scan = [&](const Pixel& pixel) {
         const float s = std::max(pixel.normalized, 0.0f);
-        if (pixel.isOn) {
-            if (s > maxOnStrength) {
-                maxOnIndex = pixel.index;
-                maxOnStrength = s;
-            }
-            someOn = true;
-        }
-        if (pixel.aboveNoise) someAboveNoise = true;
-        if (s > strongestStrength) {
-            strongestStrength = s;
-            strongestIndex = pixel.index;
-        }
+        const bool on = pixel.isOn;
+        const bool strongerOn = on && s > maxOn;
+        maxOnAt = strongerOn ? pixel.index : maxOnAt;
+        maxOn = strongerOn ? s : maxOn;
+        someOn |= on;
+        someAboveNoise |= pixel.aboveNoise;
+        const bool stronger = s > strongestStrength;
+        strongestIndex = stronger ? pixel.index : strongestIndex;
+        strongestStrength = stronger ? s : strongestStrength;
     };
     for (const Pixel& pixel : pixels) scan(pixel);
     for (const VirtualPixel& pixel : virtualPixels) scan(pixel);
+    maxOnStrength = maxOn;
+    maxOnIndex = maxOnAt;
 
     // 2.
     _wasTouching = _touching;
