@@ -9,6 +9,7 @@
 #include <sys/un.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <stdexcept>
@@ -18,12 +19,14 @@ namespace TolkaTouch {
 
 struct ControlServer::Client {
     int fd = -1;
-    std::string received;     // bytes read and not yet looked at
-    std::string input;        // bytes of the line being read
-    bool discarding = false;  // inside an oversized line: drop bytes up to its newline
-    std::string output;       // replies not yet written
+    uint64_t id = 0;
+    std::string received;       // bytes read and not yet looked at
+    std::string input;          // bytes of the line being read
+    bool discarding = false;    // inside an oversized line: drop bytes up to its newline
+    std::deque<Request> requests;  // complete lines, not yet answered
+    bool inTurn = false;        // some of its requests are with the workers
+    std::string output;         // replies not yet written
     std::size_t outputOffset = 0;
-    bool wantsWrite = false;
     bool closing = false;  // the peer stopped writing; leave once the replies are out
 };
 
@@ -113,9 +116,16 @@ ControlServer::ControlServer(std::string path, Handler handler, OversizeReply ov
     if (_wakeFd < 0 || ::epoll_ctl(_epollFd, EPOLL_CTL_ADD, _wakeFd, &event) != 0) {
         throw fail("cannot make the control socket's wake-up");
     }
+    for (std::size_t i = 0; i < kWorkers; ++i) _workers.emplace_back([this] { work(); });
 }
 
 ControlServer::~ControlServer() {
+    {
+        std::lock_guard lock(_turnsMutex);
+        _stopping = true;
+    }
+    _turnsReady.notify_all();
+    for (auto& worker : _workers) worker.join();
     for (auto& [fd, client] : _clients) ::close(fd);
     _clients.clear();
     ::close(_epollFd);
@@ -130,6 +140,11 @@ ControlServer::~ControlServer() {
     ::close(_lockFd);
 }
 
+std::string ControlServer::replyTooLong(std::size_t length) {
+    return "{\"error\":\"reply too long to send (" + std::to_string(length) + " bytes, at most " +
+           std::to_string(kMaxReplyLength) + ")\"}";
+}
+
 void ControlServer::handleReady() {
     epoll_event events[32];
     int count = ::epoll_wait(_epollFd, events, 32, 0);
@@ -140,14 +155,11 @@ void ControlServer::handleReady() {
             continue;
         }
         if (fd == _wakeFd) {
-            servePending();
+            takeFinishedTurns();
             continue;
         }
         auto it = _clients.find(fd);
-        if (it == _clients.end()) continue;
-        Client& client = *it->second;
-        if (events[i].events & (EPOLLIN | EPOLLHUP | EPOLLERR)) readFrom(client);
-        if (_clients.count(fd) && (events[i].events & EPOLLOUT)) writeTo(client);
+        if (it != _clients.end()) serve(*it->second);
     }
 }
 
@@ -166,8 +178,11 @@ void ControlServer::accept() {
         }
         auto client = std::make_unique<Client>();
         client->fd = fd;
+        client->id = _nextClientId++;
+        // Edge-triggered: the server reads and writes until the socket would block, or until the
+        // client's buffers are full, and comes back for the rest when the client's turn is over.
         epoll_event event{};
-        event.events = EPOLLIN;
+        event.events = EPOLLIN | EPOLLOUT | EPOLLRDHUP | EPOLLET;
         event.data.fd = fd;
         if (::epoll_ctl(_epollFd, EPOLL_CTL_ADD, fd, &event) != 0) {
             ::close(fd);
@@ -196,84 +211,128 @@ void ControlServer::acceptWithoutDescriptors() {
 }
 
 void ControlServer::readFrom(Client& client) {
-    // One read a turn, and only while the bytes already taken are few: a client that floods the
-    // socket waits for its own replies, not the others for theirs.
-    if (!client.closing && client.received.size() < kMaxLineLength) {
+    // Only while the bytes and requests already taken are few: a client that floods the socket
+    // waits for its own replies, and the others are not held up by its input.
+    while (!client.closing && client.received.size() < kMaxLineLength && client.requests.size() < kLinesPerTurn) {
         char buffer[16 * 1024];
-        ssize_t got;
-        do {
-            got = ::recv(client.fd, buffer, sizeof(buffer), 0);
-        } while (got < 0 && errno == EINTR);
+        const ssize_t got = ::recv(client.fd, buffer, sizeof(buffer), 0);
         if (got > 0) {
             client.received.append(buffer, static_cast<size_t>(got));
-        } else if (got == 0 || (errno != EAGAIN && errno != EWOULDBLOCK)) {
+            splitLines(client);
+        } else if (got < 0 && errno == EINTR) {
+            continue;
+        } else if (got < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) {
+            return;
+        } else {
             // The peer is done (or broken): its complete lines are still answered, a half line
             // it leaves behind is dropped unanswered.
             client.closing = true;
         }
     }
-    serve(client);
 }
 
-void ControlServer::serve(Client& client) {
-    size_t budget = kLinesPerTurn;
+void ControlServer::splitLines(Client& client) {
     size_t at = 0;
-    for (; at < client.received.size() && budget > 0; ++at) {
+    for (; at < client.received.size() && client.requests.size() < kLinesPerTurn; ++at) {
         const char c = client.received[at];
         if (c == '\n') {
             if (client.discarding) {
                 client.discarding = false;
             } else {
-                client.output += _handler(client.input);
-                client.output += '\n';
-                --budget;
+                client.requests.push_back({std::move(client.input), false});
             }
             client.input.clear();
         } else if (!client.discarding) {
             client.input += c;
             if (client.input.size() > kMaxLineLength) {
-                client.output += _oversizeReply();
-                client.output += '\n';
+                client.requests.push_back({{}, true});
                 client.input.clear();
                 client.discarding = true;
-                --budget;
             }
         }
     }
     client.received.erase(0, at);
-    if (client.closing && client.received.empty()) client.input.clear();
-
-    // What is left waits for the next turn; the wake-up keeps the loop coming back for it.
-    if (!client.received.empty()) {
-        _pending.insert(client.fd);
-        const uint64_t one = 1;
-        [[maybe_unused]] ssize_t written = ::write(_wakeFd, &one, sizeof(one));
-    } else {
-        _pending.erase(client.fd);
-    }
-
-    const int fd = client.fd;
-    writeTo(client);
-    if (!_clients.count(fd)) return;
-    if (client.closing && client.output.empty() && client.received.empty()) {
-        drop(fd);
-        return;
-    }
-    updateInterest(client);
 }
 
-void ControlServer::servePending() {
+void ControlServer::serve(Client& client) {
+    const int fd = client.fd;
+    splitLines(client);
+    readFrom(client);
+    writeTo(client);
+    if (!_clients.count(fd)) return;
+    // The next turn once the replies of the last one are out: a client that does not read its
+    // replies gets no more answers, and its output stays within one turn's.
+    if (!client.inTurn && client.output.empty() && !client.requests.empty()) {
+        Turn turn;
+        turn.client = client.id;
+        while (!client.requests.empty() && turn.requests.size() < kLinesPerTurn) {
+            turn.requests.push_back(std::move(client.requests.front()));
+            client.requests.pop_front();
+        }
+        client.inTurn = true;
+        {
+            std::lock_guard lock(_turnsMutex);
+            _waitingTurns.push_back(std::move(turn));
+        }
+        _turnsReady.notify_one();
+        splitLines(client);
+        readFrom(client);
+    }
+    if (client.closing && !client.inTurn && client.requests.empty() && client.output.empty()) drop(fd);
+}
+
+void ControlServer::takeFinishedTurns() {
     uint64_t count;
     [[maybe_unused]] ssize_t got = ::read(_wakeFd, &count, sizeof(count));
-    const std::set<int> waiting = _pending;
-    for (int fd : waiting) {
-        auto it = _clients.find(fd);
-        if (it == _clients.end()) {
-            _pending.erase(fd);
-            continue;
-        }
-        serve(*it->second);
+    std::vector<Turn> finished;
+    {
+        std::lock_guard lock(_turnsMutex);
+        finished.swap(_finishedTurns);
     }
+    for (Turn& turn : finished) {
+        auto it = std::find_if(_clients.begin(), _clients.end(),
+                               [&](const auto& entry) { return entry.second->id == turn.client; });
+        if (it == _clients.end()) continue;  // it left while its requests were answered
+        Client& client = *it->second;
+        client.output += turn.replies;
+        client.inTurn = false;
+        serve(client);
+    }
+}
+
+void ControlServer::work() {
+    for (;;) {
+        Turn turn;
+        {
+            std::unique_lock lock(_turnsMutex);
+            _turnsReady.wait(lock, [this] { return _stopping || !_waitingTurns.empty(); });
+            if (_stopping) return;
+            turn = std::move(_waitingTurns.front());
+            _waitingTurns.pop_front();
+        }
+        for (const Request& request : turn.requests) {
+            turn.replies += answer(request);
+            turn.replies += '\n';
+        }
+        {
+            std::lock_guard lock(_turnsMutex);
+            _finishedTurns.push_back(std::move(turn));
+        }
+        const uint64_t one = 1;
+        [[maybe_unused]] ssize_t written = ::write(_wakeFd, &one, sizeof(one));
+    }
+}
+
+std::string ControlServer::answer(const Request& request) const {
+    if (request.oversized) return _oversizeReply();
+    std::string reply;
+    try {
+        reply = _handler(request.line);
+    } catch (const std::exception&) {
+        return "{\"error\":\"the request failed\"}";
+    }
+    if (reply.size() > kMaxReplyLength) return replyTooLong(reply.size());
+    return reply;
 }
 
 void ControlServer::writeTo(Client& client) {
@@ -281,40 +340,18 @@ void ControlServer::writeTo(Client& client) {
         ssize_t sent = ::send(client.fd, client.output.data() + client.outputOffset,
                               client.output.size() - client.outputOffset, MSG_NOSIGNAL);
         if (sent < 0 && errno == EINTR) continue;
-        if (sent < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) break;
+        if (sent < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) return;
         if (sent < 0) {
             drop(client.fd);
             return;
         }
         client.outputOffset += static_cast<std::size_t>(sent);
     }
-    if (client.outputOffset == client.output.size()) {
-        client.output.clear();
-        client.outputOffset = 0;
-    } else if (client.output.size() - client.outputOffset > kMaxPendingOutput) {
-        drop(client.fd);  // it asks and never reads: the daemon will not keep its replies forever
-        return;
-    }
-    if (client.closing && client.output.empty() && client.received.empty()) {
-        drop(client.fd);
-        return;
-    }
-    updateInterest(client);
-}
-
-void ControlServer::updateInterest(Client& client) {
-    bool wantsWrite = !client.output.empty();
-    if (wantsWrite == client.wantsWrite && !client.closing) return;
-    epoll_event event{};
-    // A client that has stopped writing is watched only for the room to take its replies.
-    event.events = (client.closing ? 0u : EPOLLIN) | (wantsWrite ? EPOLLOUT : 0u);
-    event.data.fd = client.fd;
-    ::epoll_ctl(_epollFd, EPOLL_CTL_MOD, client.fd, &event);
-    client.wantsWrite = wantsWrite;
+    client.output.clear();
+    client.outputOffset = 0;
 }
 
 void ControlServer::drop(int fd) {
-    _pending.erase(fd);
     ::epoll_ctl(_epollFd, EPOLL_CTL_DEL, fd, nullptr);
     ::close(fd);
     _clients.erase(fd);

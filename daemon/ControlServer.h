@@ -1,33 +1,45 @@
 #pragma once
 // ControlServer: the daemon's Unix-domain control socket. Clients write one request per line and
-// read one reply per line. Everything is non-blocking behind one epoll descriptor of its own,
-// which the daemon's event loop watches: a client that connects and never writes, writes half a
-// line and leaves, or never reads its replies, costs a descriptor and a bounded buffer, and never
-// holds up the daemon. Lines longer than kMaxLineLength get an error reply.
+// read one reply per line. The socket work is non-blocking behind one epoll descriptor of its own,
+// which the daemon's event loop watches; the requests are answered on the server's own worker
+// threads, so that a reply that takes long to build (a whole recording) holds up neither the loop
+// (and the key output on it) nor the other clients. A client that connects and never writes,
+// writes half a line and leaves, or never reads its replies, costs a descriptor and a bounded
+// buffer, and never holds up the daemon. Lines longer than kMaxLineLength get an error reply, and
+// so does a request whose reply would be longer than kMaxReplyLength.
 
 #include <sys/types.h>
 
+#include <condition_variable>
 #include <cstddef>
+#include <cstdint>
+#include <deque>
 #include <functional>
 #include <map>
 #include <memory>
-#include <set>
+#include <mutex>
 #include <string>
+#include <thread>
+#include <vector>
 
 namespace TolkaTouch {
 
 class ControlServer {
 public:
     static constexpr std::size_t kMaxLineLength = 64 * 1024;
-    // A client whose unread replies grow past this is disconnected.
-    static constexpr std::size_t kMaxPendingOutput = 16 * 1024 * 1024;
+    // A reply longer than this is not sent: the request gets an error reply naming the length.
+    static constexpr std::size_t kMaxReplyLength = 16 * 1024 * 1024;
     // Clients beyond this many get a refusal line and are closed.
     static constexpr std::size_t kMaxClients = 64;
     static constexpr int kListenBacklog = 128;
     // Requests answered for one client before the others get their turn.
     static constexpr std::size_t kLinesPerTurn = 8;
+    // Threads that answer requests. Each client has at most one turn with them at a time, so a
+    // slow reply holds up only its own client while fewer than this many are being built.
+    static constexpr std::size_t kWorkers = 4;
 
     // Answers one request line (without its newline) with one reply line (without newline).
+    // Called on the worker threads, several at once for different clients.
     using Handler = std::function<std::string(const std::string& line)>;
     // The reply given, without calling the handler, to a line over kMaxLineLength.
     using OversizeReply = std::function<std::string()>;
@@ -45,19 +57,35 @@ public:
     // The descriptor to watch for readability; then call handleReady().
     int pollFd() const { return _epollFd; }
 
-    // Does all the work that is ready now without waiting: accepts, reads, answers, writes.
+    // Does all the socket work that is ready now without waiting: accepts, reads, hands requests
+    // to the workers, writes the replies they have finished.
     void handleReady();
 
     std::size_t clientCount() const { return _clients.size(); }
 
+    // The one-line reply that stands in for one longer than kMaxReplyLength.
+    static std::string replyTooLong(std::size_t length);
+
 private:
     struct Client;
+    struct Request {
+        std::string line;
+        bool oversized = false;  // longer than kMaxLineLength: answered without the handler
+    };
+    // One client's turn with the workers: its next requests, and then their replies.
+    struct Turn {
+        uint64_t client = 0;
+        std::vector<Request> requests;
+        std::string replies;
+    };
     void accept();
     void readFrom(Client& client);
+    void splitLines(Client& client);
     void serve(Client& client);
-    void servePending();
+    void takeFinishedTurns();
+    void work();
+    std::string answer(const Request& request) const;
     void writeTo(Client& client);
-    void updateInterest(Client& client);
     void drop(int fd);
     void refuse(int fd, const std::string& reply);
     void acceptWithoutDescriptors();
@@ -71,12 +99,18 @@ private:
     // Kept open so that, with the descriptor table full, a waiting client can still be taken off
     // the queue and told why: otherwise the listening socket stays readable and the loop spins.
     int _reserveFd = -1;
-    // Clients with requests read and not yet answered, and the descriptor that keeps the loop
-    // coming back for them.
-    std::set<int> _pending;
+    // Signalled by a worker that has finished a turn, so that the loop comes back for it.
     int _wakeFd = -1;
     ino_t _socketInode = 0;  // the socket file this server made, so that only it is removed
     std::map<int, std::unique_ptr<Client>> _clients;
+    uint64_t _nextClientId = 1;  // a descriptor is reused; a turn names its client by this
+
+    std::mutex _turnsMutex;
+    std::condition_variable _turnsReady;
+    std::deque<Turn> _waitingTurns;   // in the order the clients became ready: round robin
+    std::vector<Turn> _finishedTurns;
+    bool _stopping = false;
+    std::vector<std::thread> _workers;
 };
 
 }  // namespace TolkaTouch

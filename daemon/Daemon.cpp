@@ -9,6 +9,7 @@
 #include <chrono>
 #include <csignal>
 #include <cstring>
+#include <mutex>
 #include <stdexcept>
 
 #include "common/FeatureReports.h"
@@ -55,7 +56,8 @@ struct Daemon::Device {
     uint16_t vendor = 0;
     uint16_t product = 0;
     HIDDeviceRef handle;
-    std::unique_ptr<PluginInstance> instance;
+    // Shared with a control request being answered on the control socket's worker.
+    std::shared_ptr<PluginInstance> instance;
     std::unique_ptr<KeyMapper> keys;  // null when no keys are written
 };
 
@@ -94,13 +96,17 @@ Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
 }
 
 Daemon::~Daemon() {
+    _control.reset();  // no request is answered against a daemon being taken apart
     stopFeeder();
     for (auto& [service, device] : _devices) {
         if (device->keys) device->keys->releaseAll();
         device->instance->shutdown();
         HIDServiceRegistry::unregisterService(service);
     }
-    _devices.clear();
+    {
+        std::lock_guard lock(_devicesMutex);
+        _devices.clear();
+    }
     if (_eventQueue) _eventQueue->sync([] {});
     if (_signalFd >= 0) ::close(_signalFd);
     if (_timerFd >= 0) ::close(_timerFd);
@@ -202,7 +208,7 @@ void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDD
                                            reinterpret_cast<void*>(static_cast<uintptr_t>(service))};
     auto device = std::make_unique<Device>();
     try {
-        device->instance = std::make_unique<PluginInstance>(*_plugin, service, PropertyValue(std::move(matching)),
+        device->instance = std::make_shared<PluginInstance>(*_plugin, service, PropertyValue(std::move(matching)),
                                                             callback, _eventQueue);
     } catch (const std::exception& error) {
         HIDServiceRegistry::unregisterService(service);
@@ -216,19 +222,25 @@ void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDD
     device->handle = std::move(handle);
     if (_keyOutput) device->keys = std::make_unique<KeyMapper>(*_keyOutput, monotonicNow);
     _log.log("serving %s (%s) as service %u", device->node.c_str(), hexId(vendor, product).c_str(), service);
+    std::lock_guard lock(_devicesMutex);
     _devices.emplace(service, std::move(device));
 }
 
 void Daemon::removeDevice(uint32_t service, const char* reason) {
-    auto it = _devices.find(service);
-    if (it == _devices.end()) return;
-    Device& device = *it->second;
+    std::unique_ptr<Device> removed;
+    {
+        std::lock_guard lock(_devicesMutex);
+        auto it = _devices.find(service);
+        if (it == _devices.end()) return;
+        removed = std::move(it->second);
+        _devices.erase(it);
+    }
+    Device& device = *removed;
     // A pulled cable must not leave a key down: let go before anything else.
     if (device.keys) device.keys->releaseAll();
     device.instance->shutdown();
     HIDServiceRegistry::unregisterService(service);
     _log.log("stopped serving %s (service %u): %s", device.node.c_str(), service, reason);
-    _devices.erase(it);
     // Events the service queued before it stopped still reach the run loop (to be printed); the
     // device's keys are gone, so none of them can press a key again.
     _eventQueue->sync([] {});
@@ -329,14 +341,16 @@ void Daemon::stopFeeder() {
     _feeder->stop();
 }
 
-Daemon::Device* Daemon::findDevice(std::optional<uint32_t> service) {
+std::shared_ptr<PluginInstance> Daemon::findInstance(std::optional<uint32_t> service) {
+    std::lock_guard lock(_devicesMutex);
     if (_devices.empty()) return nullptr;
-    if (!service) return _devices.begin()->second.get();
+    if (!service) return _devices.begin()->second->instance;
     auto it = _devices.find(*service);
-    return it == _devices.end() ? nullptr : it->second.get();
+    return it == _devices.end() ? nullptr : it->second->instance;
 }
 
 std::vector<ControlDeviceInfo> Daemon::devices() {
+    std::lock_guard lock(_devicesMutex);
     std::vector<ControlDeviceInfo> list;
     for (const auto& [service, device] : _devices) {
         list.push_back({service, device->node, device->vendor, device->product});
@@ -344,17 +358,19 @@ std::vector<ControlDeviceInfo> Daemon::devices() {
     return list;
 }
 
+// The instance is copied out under the lock and used without it: a whole recording being read
+// out holds up no device being added or removed on the run loop.
 std::optional<PropertyValue> Daemon::getProperty(std::optional<uint32_t> service, const std::string& key) {
-    Device* device = findDevice(service);
-    if (!device) return std::nullopt;
-    return device->instance->copyProperty(key);
+    auto instance = findInstance(service);
+    if (!instance) return std::nullopt;
+    return instance->copyProperty(key);
 }
 
 std::optional<bool> Daemon::setProperty(std::optional<uint32_t> service, const std::string& key,
                                         const PropertyValue& value) {
-    Device* device = findDevice(service);
-    if (!device) return std::nullopt;
-    return device->instance->setProperty(key, value);
+    auto instance = findInstance(service);
+    if (!instance) return std::nullopt;
+    return instance->setProperty(key, value);
 }
 
 }  // namespace TolkaTouch

@@ -10,6 +10,7 @@
 #include <cstdio>
 #include <map>
 #include <memory>
+#include <mutex>
 #include <optional>
 #include <string>
 
@@ -64,7 +65,7 @@ public:
     // Answers the process's exit status.
     int run();
 
-    // ControlTarget
+    // ControlTarget: called on the control socket's workers, while the run loop goes on.
     std::vector<ControlDeviceInfo> devices() override;
     std::optional<PropertyValue> getProperty(std::optional<uint32_t> service, const std::string& key) override;
     std::optional<bool> setProperty(std::optional<uint32_t> service, const std::string& key,
@@ -87,7 +88,7 @@ private:
     void armRepeatTimer();
     void beginShutdown();
     void stopFeeder();
-    Device* findDevice(std::optional<uint32_t> service);
+    std::shared_ptr<PluginInstance> findInstance(std::optional<uint32_t> service);
 
     DaemonOptions _options;
     std::FILE* _printOutput;
@@ -106,7 +107,10 @@ private:
     int _signalFd = -1;
     int _timerFd = -1;
 
+    // Changed only on the run loop, under the lock, which the control socket's workers take to
+    // look a device up.
     std::map<uint32_t, std::unique_ptr<Device>> _devices;
+    std::mutex _devicesMutex;
     uint32_t _nextService = 1;
     bool _running = true;
     bool _shuttingDown = false;

@@ -1,6 +1,7 @@
 #include "daemon/PluginInstance.h"
 
 #include <cstdio>
+#include <mutex>
 #include <stdexcept>
 
 namespace TolkaTouch {
@@ -55,6 +56,7 @@ PluginInstance::~PluginInstance() {
 }
 
 void PluginInstance::shutdown() {
+    std::unique_lock lock(_lifetime);
     undo();
 }
 
@@ -82,11 +84,13 @@ void PluginInstance::undo() {
 }
 
 PropertyValue PluginInstance::copyProperty(const std::string& key) const {
+    std::shared_lock lock(_lifetime);
     if (!_hidService) return PropertyValue();
     return (*_hidService)->copyProperty(_hidService, key.c_str());
 }
 
 bool PluginInstance::setProperty(const std::string& key, const PropertyValue& value) {
+    std::shared_lock lock(_lifetime);
     if (!_hidService) return false;
     return (*_hidService)->setProperty(_hidService, key.c_str(), &value);
 }

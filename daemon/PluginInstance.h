@@ -2,9 +2,11 @@
 // PluginInstance: one HID service from the plug-in, serving one device, reached only through the
 // plug-in's two interface tables. Brought up in the host's order (probe, start, open, event
 // callback, schedule on the daemon's dispatch queue) and torn down in the reverse one (unschedule,
-// close, stop, release). Properties are read and written from any thread; the service locks.
+// close, stop, release). Properties are read and written from any thread; the service locks, and
+// the teardown waits for a property call in progress (after it, they answer nothing).
 
 #include <cstdint>
+#include <shared_mutex>
 #include <string>
 
 #include "daemon/PluginLibrary.h"
@@ -44,6 +46,8 @@ private:
 
     uint32_t _service;
     DispatchQueueRef _queue;
+    // Property calls hold it shared; the teardown holds it alone.
+    mutable std::shared_mutex _lifetime;
     Host::PlugInInterface** _plugin = nullptr;
     Host::HIDServiceInterface** _hidService = nullptr;
     bool _started = false;

@@ -15,7 +15,11 @@
 #include <cstring>
 #include <filesystem>
 #include <fstream>
+#include <functional>
+#include <future>
+#include <mutex>
 #include <stdexcept>
+#include <thread>
 
 namespace TolkaTouch {
 namespace {
@@ -33,14 +37,23 @@ protected:
         std::filesystem::remove_all(directory);
     }
 
+    // The handler runs on the server's workers: what it saw is kept under a lock.
     void startServer() {
         server = std::make_unique<ControlServer>(
             path,
             [this](const std::string& line) {
-                handled.push_back(line);
-                return "reply:" + line;
+                {
+                    std::lock_guard lock(handledMutex);
+                    handled.push_back(line);
+                }
+                return respond ? respond(line) : "reply:" + line;
             },
             [] { return std::string("too long"); });
+    }
+
+    std::vector<std::string> handledLines() {
+        std::lock_guard lock(handledMutex);
+        return handled;
     }
 
     int connectClient() {
@@ -93,6 +106,8 @@ protected:
     std::string directory;
     std::string path;
     std::unique_ptr<ControlServer> server;
+    std::function<std::string(const std::string&)> respond;  // the reply; "reply:LINE" when unset
+    std::mutex handledMutex;
     std::vector<std::string> handled;
     std::vector<int> clients;
 };
@@ -109,7 +124,7 @@ TEST_F(ControlServerTest, LineSplitAcrossWritesIsAnsweredOnceComplete) {
     int client = connectClient();
     send(client, "hal");
     serveFor(50);
-    EXPECT_TRUE(handled.empty());
+    EXPECT_TRUE(handledLines().empty());
     send(client, "f\n");
     EXPECT_EQ(receiveLines(client, 1), "reply:half\n");
 }
@@ -122,7 +137,7 @@ TEST_F(ControlServerTest, OversizedLineGetsTheErrorReplyAndTheNextLineIsServed) 
     std::string replies = receiveLines(client, 2);
     writer.join();
     EXPECT_EQ(replies, "too long\nreply:next\n");
-    EXPECT_EQ(handled, (std::vector<std::string>{"next"}));
+    EXPECT_EQ(handledLines(), (std::vector<std::string>{"next"}));
 }
 
 TEST_F(ControlServerTest, LineOfExactlyTheLimitIsServed) {
@@ -153,7 +168,7 @@ TEST_F(ControlServerTest, ClientLeavingMidLineIsDroppedUnanswered) {
     clients.clear();
     for (int i = 0; i < 20 && server->clientCount() > 0; ++i) serveFor(10);
     EXPECT_EQ(server->clientCount(), 0u);
-    EXPECT_TRUE(handled.empty());
+    EXPECT_TRUE(handledLines().empty());
 }
 
 TEST_F(ControlServerTest, ClientThatSendsAndLeavesStillHasItsLineAnswered) {
@@ -268,12 +283,69 @@ TEST_F(ControlServerTest, AFloodingClientCannotHoldUpAQuietOne) {
     // The quiet client is answered after at most one more turn of the flooder's.
     const std::string reply = receiveLines(quiet, 1);
     EXPECT_EQ(reply, "reply:q\n");
-    const auto answeredFlood = std::count(handled.begin(), handled.end(), "f");
+    const std::vector<std::string> seen = handledLines();
+    const auto answeredFlood = std::count(seen.begin(), seen.end(), "f");
     EXPECT_LE(answeredFlood, static_cast<long>(3 * ControlServer::kLinesPerTurn));
     // ... and the flooder still gets every one of its replies in the end.
-    EXPECT_EQ(std::count(handled.begin(), handled.end(), "q"), 1);
+    EXPECT_EQ(std::count(seen.begin(), seen.end(), "q"), 1);
     std::string floodReplies = receiveLines(flooder, 1000);
     EXPECT_EQ(std::count(floodReplies.begin(), floodReplies.end(), '\n'), 1000);
+}
+
+TEST_F(ControlServerTest, RepliesComeInTheOrderOfTheRequestsAcrossManyTurns) {
+    startServer();
+    int client = connectClient();
+    std::string requests, expected;
+    for (int i = 0; i < 5 * static_cast<int>(ControlServer::kLinesPerTurn) + 3; ++i) {
+        requests += std::to_string(i) + "\n";
+        expected += "reply:" + std::to_string(i) + "\n";
+    }
+    send(client, requests);
+    EXPECT_EQ(receiveLines(client, 43), expected);
+}
+
+TEST_F(ControlServerTest, AReplyBeingBuiltHoldsUpNeitherTheLoopNorAnotherClient) {
+    std::promise<void> release;
+    std::shared_future<void> released = release.get_future().share();
+    respond = [released](const std::string& line) {
+        if (line == "slow") released.wait();  // a whole recording being written out
+        return "reply:" + line;
+    };
+    startServer();
+    int slow = connectClient();
+    int quick = connectClient();
+    send(slow, "slow\n");
+    serveFor(50);
+    send(quick, "quick\n");
+    EXPECT_EQ(receiveLines(quick, 1), "reply:quick\n");
+    release.set_value();
+    EXPECT_EQ(receiveLines(slow, 1), "reply:slow\n");
+}
+
+TEST_F(ControlServerTest, AReplyTooLongToSendGetsAnErrorReplyAndTheNextRequestIsServed) {
+    respond = [](const std::string& line) {
+        return line == "huge" ? std::string(ControlServer::kMaxReplyLength + 1, 'r') : "reply:" + line;
+    };
+    startServer();
+    int client = connectClient();
+    send(client, "huge\nnext\n");
+    EXPECT_EQ(receiveLines(client, 2),
+              "{\"error\":\"reply too long to send (16777217 bytes, at most 16777216)\"}\nreply:next\n");
+}
+
+TEST_F(ControlServerTest, AClientThatNeverReadsGetsNoMoreAnswersThanOneTurnsWorth) {
+    respond = [](const std::string& line) { return line + std::string(64 * 1024, '.'); };
+    startServer();
+    int client = connectClient();
+    int buffer = 4096;
+    ::setsockopt(client, SOL_SOCKET, SO_RCVBUF, &buffer, sizeof(buffer));
+    std::string requests;
+    for (int i = 0; i < 200; ++i) requests += "r\n";
+    send(client, requests);
+    for (int i = 0; i < 30; ++i) serveFor(10);
+    // The first turn's replies do not fit the socket, so no second turn is answered.
+    EXPECT_EQ(handledLines().size(), ControlServer::kLinesPerTurn);
+    EXPECT_EQ(server->clientCount(), 1u);
 }
 
 TEST_F(ControlServerTest, SocketPathTooLongIsRefused) {

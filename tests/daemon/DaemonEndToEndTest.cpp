@@ -10,6 +10,7 @@
 #include <chrono>
 #include <cstring>
 #include <filesystem>
+#include <fstream>
 #include <nlohmann/json.hpp>
 #include <string>
 #include <thread>
@@ -323,6 +324,60 @@ TEST_F(DaemonEndToEndTest, SighupDoesNotStopTheDaemon) {
     ::close(connectControl());  // still answering
     daemon->signal(SIGTERM);
     EXPECT_EQ(daemon->wait(1000ms), 0);
+}
+
+TEST_F(DaemonEndToEndTest, SighupReadsTheLogConfigurationAgainAndABrokenOneChangesNothing) {
+    const std::string configuration = file("log.conf");
+    std::ofstream(configuration) << "Algs error\n";
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys", "--log-config", configuration});
+    const int control = connectControl();
+    const auto algsLevel = [&] {
+        return nlohmann::json::parse(exchange(control, "{\"log\": true}\n"))["levels"].value("Algs", "?");
+    };
+    EXPECT_EQ(algsLevel(), "error");
+
+    std::ofstream(configuration) << "Algs info\n";
+    daemon->signal(SIGHUP);
+    auto deadline = std::chrono::steady_clock::now() + 5s;
+    while (algsLevel() != "info" && std::chrono::steady_clock::now() < deadline) std::this_thread::sleep_for(5ms);
+    EXPECT_EQ(algsLevel(), "info");
+
+    std::ofstream(configuration) << "Algs loud\n";
+    daemon->signal(SIGHUP);
+    deadline = std::chrono::steady_clock::now() + 5s;
+    while (daemon->standardError().find("SIGHUP: " + configuration + ": line 1") == std::string::npos &&
+           std::chrono::steady_clock::now() < deadline) {
+        std::this_thread::sleep_for(5ms);
+    }
+    EXPECT_NE(daemon->standardError().find("SIGHUP: " + configuration + ": line 1"), std::string::npos);
+    EXPECT_EQ(algsLevel(), "info");
+    ::close(control);
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, SigtermWhileEventsStreamLeavesEveryPrintedEventWholeAndInTheReplaysOrder) {
+    const std::string document = synthesize("everyday.gestures");
+    ASSERT_EQ(runToCompletion({TOLKATOUCH_PATH, "replay", "--json", "--fast", document}, file("replay.out"),
+                              file("replay.err")),
+              0);
+    const auto expected = withoutTimestamps(Testing::readWholeFile(file("replay.out")));
+    ASSERT_GT(expected.size(), 4u);
+    auto daemon = startDaemon(document, {"--no-keys", "--print", "--speed", "20"});
+    auto deadline = std::chrono::steady_clock::now() + 20s;
+    while (lines(daemon->standardOutput()).size() < 2 && std::chrono::steady_clock::now() < deadline) {
+        std::this_thread::sleep_for(1ms);
+    }
+    daemon->signal(SIGTERM);  // events are being handed over: some still queued
+    auto status = daemon->wait(10s);
+    ASSERT_TRUE(status) << "still running after SIGTERM";
+    EXPECT_EQ(*status, 0) << daemon->standardError().substr(0, 2000);
+    const std::string out = daemon->standardOutput();
+    ASSERT_TRUE(out.empty() || out.back() == '\n') << "an event line was cut short";
+    const auto printed = withoutTimestamps(out);
+    ASSERT_LE(printed.size(), expected.size());
+    EXPECT_EQ(printed, std::vector<std::string>(expected.begin(), expected.begin() + printed.size()));
+    EXPECT_FALSE(std::filesystem::exists(socket));
 }
 
 TEST_F(DaemonEndToEndTest, SecondDaemonOnTheSameSocketRefusesToStart) {

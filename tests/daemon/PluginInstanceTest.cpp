@@ -30,6 +30,13 @@ struct Received {
     }
 };
 
+// Loaded once and never unloaded, as the daemon does: the service's input report thread may still
+// be finishing its last lines after the service has gone, and must not find its code unmapped.
+PluginLibrary& loadedOnce() {
+    static PluginLibrary* library = new PluginLibrary(TOLKA_PLUGIN_PATH);
+    return *library;
+}
+
 class PluginInstanceTest : public ::testing::Test {
 protected:
     void SetUp() override {
@@ -46,7 +53,7 @@ protected:
     }
 
     static constexpr uint32_t kService = 4101;
-    PluginLibrary library{TOLKA_PLUGIN_PATH};
+    PluginLibrary& library = loadedOnce();
     DispatchQueueRef queue = DispatchQueue::create("test.events");
     std::shared_ptr<SimulatedHIDDevice> device;
     Received received;

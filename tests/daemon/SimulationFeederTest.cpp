@@ -1,6 +1,9 @@
 #include "daemon/SimulationFeeder.h"
 
 #include <gtest/gtest.h>
+
+#include "daemon/CountingHIDDevice.h"
+#include "platform/SimulatedHIDDevice.h"
 #include <unistd.h>
 
 #include <condition_variable>
@@ -89,6 +92,53 @@ TEST_F(SimulationFeederTest, StopCutsALongPauseShortAndSkipsFinished) {
     }
     feeder.stop();
     EXPECT_TRUE(feeder.stopRequested());
+    EXPECT_FALSE(finished);
+}
+
+// As the daemon plays a document: a recorded setting waits until the service has handled the
+// reports before it. Here nothing handles them (the device is scheduled nowhere), so the feeder
+// is stopped in the middle of that wait, as a signal stops the daemon.
+TEST_F(SimulationFeederTest, StopWhileASettingWaitsForItsReportsEndsTheWaitWithoutApplyingIt) {
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 03 "},
+        {"Type": "InputReport", "Timestamp": 1100, "Report": "01 02 04 "},
+        {"Type": "State", "Timestamp": 1500, "Key": "Algs.HoldTimeoutMilliseconds", "Value": 700},
+        {"Type": "InputReport", "Timestamp": 2000, "Report": "02 00 "}]})");
+    auto device = SimulatedHIDDevice::create();
+    auto counter = std::make_shared<CountingHIDDevice>(device);
+    std::vector<uint8_t> buffer(64);
+    counter->registerInputReportCallback(
+        buffer.data(), buffer.size(), [](void*, uint32_t, void*, HIDReportType, uint32_t, const uint8_t*, size_t, uint64_t) {},
+        nullptr);
+    SimulationFeeder feeder(path, 1000.0f);
+    uint64_t written = 0;  // the feeder's thread only
+    bool waiting = false;
+    SimulationFeeder::Target playing = target();
+    playing.writeReport = [&](const uint8_t* bytes, size_t length) {
+        if (device->writeInputReport(bytes, length)) ++written;
+    };
+    playing.applySetting = [&](const std::string& key, const PropertyValue& value) {
+        {
+            std::lock_guard lock(mutex);
+            waiting = true;
+        }
+        changed.notify_all();
+        counter->waitForDelivered(written, [&] { return feeder.stopRequested(); });
+        if (feeder.stopRequested()) return;
+        std::lock_guard lock(mutex);
+        calls.push_back("set " + key + " " + value.description());
+    };
+    feeder.start(std::move(playing));
+    {
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [&] { return waiting; });
+    }
+    feeder.requestStop();
+    counter->wakeWaiters();
+    feeder.stop();
+    EXPECT_EQ(counter->deliveredCount(), 0u);
+    std::lock_guard lock(mutex);
+    EXPECT_TRUE(calls.empty());
     EXPECT_FALSE(finished);
 }
 

@@ -1,5 +1,6 @@
-// Reports, property traffic and rescheduling all at once: nothing is lost, nothing is reordered,
-// nothing deadlocks, and (under the thread sanitizer) nothing races.
+// Reports, property traffic and rescheduling all at once, the device unplugged while reports
+// stream, and the service taken down with events still queued: nothing is lost, nothing is
+// reordered, nothing deadlocks, and (under the thread sanitizer) nothing races.
 #include <gtest/gtest.h>
 
 #include <atomic>
@@ -8,6 +9,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <future>
 #include <thread>
 
 #include "pipeline/PipelineRecording.h"
@@ -146,6 +148,89 @@ TEST(TolkaTouchHIDServiceStressTest, ReportsPropertiesAndReschedulingTogetherLos
     host.close();
     host.stop();
     host.release();
+    Trace::setSink(nullptr);
+    SystemLog::setSink(nullptr);
+}
+
+// Events carry the service's clock: one after another, in the order of their reports.
+void expectOnePerReportInOrder(const std::vector<Testing::ReceivedEvent>& events, size_t reports) {
+    ASSERT_EQ(events.size(), reports);
+    for (size_t i = 0; i < events.size(); ++i) {
+        ASSERT_TRUE(events[i].onQueue);
+        ASSERT_EQ(events[i].event->type, HIDEventType::VendorDefined);
+        if (i > 0) {
+            ASSERT_GT(events[i].event->timestamp, events[i - 1].event->timestamp) << "event " << i;
+        }
+    }
+}
+
+TEST(TolkaTouchHIDServiceStressTest, UnplugWhileReportsStreamDeliversEveryReportTakenOnceInOrder) {
+    Watchdog watchdog;
+    SystemLog::setSink(std::make_shared<CountingLogSink>());
+    PlugInHost host;
+    host.run();
+
+    // The writer goes on until the device refuses: every report it got in is an event.
+    size_t accepted = 0;
+    std::thread writer([&] {
+        for (uint32_t number = 0; host.device->writeInputReport(numberedReset(number)); ++number) {
+            ++accepted;
+            if (number % 64 == 63) std::this_thread::sleep_for(std::chrono::microseconds(200));
+        }
+    });
+    std::atomic<bool> unplugged{false};
+    std::thread propertyTraffic([&] {
+        for (uint32_t round = 0; !unplugged.load(); ++round) {
+            host.copyProperty("Recording");
+            host.setProperty("Pipeline.Algs.HoldTimeoutMilliseconds", PropertyValue(400 + round % 200));
+        }
+    });
+    ASSERT_TRUE(host.collector.waitForCount(500, std::chrono::duration<double>(kTimeLimit).count()));
+    host.device->simulateRemoval();
+    writer.join();
+    unplugged = true;
+    propertyTraffic.join();
+    ASSERT_TRUE(Testing::eventually([&] { return host.collector.count() >= accepted; },
+                                    std::chrono::duration<double>(kTimeLimit).count()));
+    host.halt();
+    host.queue->sync([] {});
+
+    expectOnePerReportInOrder(host.collector.events(), accepted);
+    EXPECT_FALSE(host.device->writeInputReport(numberedReset(0)));
+    host.release();
+    SystemLog::setSink(nullptr);
+}
+
+TEST(TolkaTouchHIDServiceStressTest, ServiceTakenDownWithEventsStillQueuedDeliversThemAfterItsLastRelease) {
+    Watchdog watchdog;
+    auto traceSink = std::make_shared<Trace::MemorySink>();
+    Trace::setSink(traceSink);
+    SystemLog::setSink(std::make_shared<CountingLogSink>());
+    PlugInHost host;
+    host.run();
+
+    // The host's queue is busy elsewhere: the service's deliveries pile up behind this task.
+    std::promise<void> hostBusy;
+    std::shared_future<void> hostFree = hostBusy.get_future().share();
+    host.queue->async([hostFree] { hostFree.wait(); });
+    constexpr uint32_t kQueued = 2000;
+    for (uint32_t number = 0; number < kQueued; ++number) host.write(numberedReset(number));
+    const auto handled = [&] {
+        size_t count = 0;
+        for (const Trace::Record& record : traceSink->records()) count += record.code == 0x2B15018C;
+        return count;
+    };
+    ASSERT_TRUE(Testing::eventually([&] { return handled() == kQueued; },
+                                    std::chrono::duration<double>(kTimeLimit).count()));
+    EXPECT_EQ(host.collector.count(), 0u);
+
+    // Unschedule, close, stop and the last release while every event still waits in the queue.
+    host.halt();
+    host.release();
+    hostBusy.set_value();
+    host.queue->sync([] {});
+
+    expectOnePerReportInOrder(host.collector.events(), kQueued);
     Trace::setSink(nullptr);
     SystemLog::setSink(nullptr);
 }
