@@ -12,6 +12,7 @@
 #include <stdexcept>
 
 #include "common/FeatureReports.h"
+#include "daemon/ContextHIDDevice.h"
 #include "daemon/ControlServer.h"
 #include "daemon/CountingHIDDevice.h"
 #include "daemon/DeviceDiscovery.h"
@@ -88,6 +89,12 @@ Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
     if (_signalFd < 0) throw systemError("cannot take signals through a signalfd");
     _timerFd = ::timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
     if (_timerFd < 0) throw systemError("cannot create the key repeat timer");
+    // Once a second the log's rate guard writes the summaries of lines it folded, so that a burst
+    // that stops is still counted within a second.
+    _logTimerFd = ::timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
+    if (_logTimerFd < 0) throw systemError("cannot create the log timer");
+    const itimerspec everySecond{{1, 0}, {1, 0}};
+    ::timerfd_settime(_logTimerFd, 0, &everySecond, nullptr);
 
     _loop = RunLoop::current();
     _eventQueue = DispatchQueue::create("tolkatouchd.events");
@@ -104,6 +111,9 @@ Daemon::~Daemon() {
     if (_eventQueue) _eventQueue->sync([] {});
     if (_signalFd >= 0) ::close(_signalFd);
     if (_timerFd >= 0) ::close(_timerFd);
+    if (_logTimerFd >= 0) ::close(_logTimerFd);
+    // Lines the rate guard folded and has not summarised yet are counted before the daemon goes.
+    SystemLog::flushFolded(true);
 }
 
 int Daemon::run() {
@@ -121,6 +131,11 @@ int Daemon::run() {
 void Daemon::addSources() {
     _loop->addSource(_signalFd, kLoopMode, [this] { handleSignal(); });
     _loop->addSource(_timerFd, kLoopMode, [this] { handleRepeatTimer(); });
+    _loop->addSource(_logTimerFd, kLoopMode, [this] {
+        uint64_t expirations;
+        [[maybe_unused]] ssize_t got = ::read(_logTimerFd, &expirations, sizeof(expirations));
+        SystemLog::flushFolded();
+    });
     _loop->addSource(_control->pollFd(), kLoopMode, [this] { _control->handleReady(); });
     if (_discovery) {
         _loop->addSource(_discovery->pollFd(), kLoopMode, [this] {
@@ -188,8 +203,10 @@ void Daemon::addHidrawNode(const HidrawNode& node) {
 
 void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDDeviceRef handle) {
     uint32_t service = _nextService++;
-    // The service's start asks the registry for its device: it gets the handle opened here.
-    HIDServiceRegistry::registerService(service, [handle] { return handle; });
+    // The service's start asks the registry for its device: it gets the handle opened here, which
+    // names the device and the frame in every log line written while one of its reports is handled.
+    HIDDeviceRef logged = std::make_shared<ContextHIDDevice>(handle, node, service);
+    HIDServiceRegistry::registerService(service, [logged] { return logged; });
     // Runs on the service's input report thread, which must not tear itself down: hand over.
     handle->setRemovalHandler([this, service] {
         _loop->performBlock(kLoopMode, [this, service] { removeDevice(service, "the device went away"); });

@@ -105,6 +105,7 @@ private:
     uint64_t _simulatedWritten = 0;  // reports written by the feeder (its thread only)
     int _signalFd = -1;
     int _timerFd = -1;
+    int _logTimerFd = -1;
 
     std::map<uint32_t, std::unique_ptr<Device>> _devices;
     uint32_t _nextService = 1;
