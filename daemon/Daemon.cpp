@@ -178,7 +178,8 @@ void Daemon::startDevices() {
         // A recorded setting follows the reports before it, as it did when it was recorded.
         _simulatedCounter->waitForDelivered(_simulatedWritten, [this] { return _feeder->stopRequested(); });
         if (_feeder->stopRequested()) return;
-        instance->setProperty("Pipeline." + key, value);
+        const bool taken = instance->setProperty("Pipeline." + key, value);
+        _log.log("setting Pipeline.%s = %s %s", key.c_str(), value.description().c_str(), taken ? "taken" : "refused");
     };
     target.finished = [this] { _simulated->simulateRemoval(); };
     _feeder->start(std::move(target));
@@ -371,7 +372,11 @@ std::optional<bool> Daemon::setProperty(std::optional<uint32_t> service, const s
                                         const PropertyValue& value) {
     Device* device = findDevice(service);
     if (!device) return std::nullopt;
-    return device->instance->setProperty(key, value);
+    const bool taken = device->instance->setProperty(key, value);
+    // Every change of a setting is in the journal, whoever made it.
+    _log.log("setting %s = %s %s (service %u)", key.c_str(), value.description().c_str(), taken ? "taken" : "refused",
+             device->service);
+    return taken;
 }
 
 }  // namespace TolkaTouch

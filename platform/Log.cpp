@@ -278,6 +278,8 @@ thread_local LogContext threadContext;
 const char* sourceRelative(const char* file) {
     static const size_t rootLength = std::strlen(TOLKA_SOURCE_ROOT);
     if (rootLength > 0 && std::strncmp(file, TOLKA_SOURCE_ROOT, rootLength) == 0) return file + rootLength;
+    // A build directory inside the tree names sources relative to itself.
+    while (std::strncmp(file, "../", 3) == 0) file += 3;
     return file;
 }
 

@@ -26,12 +26,14 @@ env -u TOLKATOUCH_LOG -u TOLKATOUCH_DEBUG -u INVOCATION_ID "$daemon" --simulate 
   > "$work/events.jsonl" 2> "$work/log.txt"
 
 lines=$(wc -l < "$work/log.txt")
+# A journal entry is one line of the log; its text may run over several lines on standard error.
+entries=$(grep -c '^\[' "$work/log.txt" || true)
 gestures=$(wc -l < "$work/events.jsonl")
 dispatched=$(grep -c 'Dispatch event: ' "$work/log.txt" || true)
 folded_dispatch=$(grep 'Dispatch event: ' "$work/log.txt" | grep -c 'lines like this' || true)
 errors=$(grep -c '^\[error\]' "$work/log.txt" || true)
-rate=$(awk -v l="$lines" -v s="$seconds" 'BEGIN { printf "%.2f", l / s }')
+rate=$(awk -v l="$entries" -v s="$seconds" 'BEGIN { printf "%.2f", l / s }')
 echo "session: ${seconds}s, ${frames} frames at 125/s; options: ${*:-none}"
-echo "log lines: ${lines} (${rate} a second); events dispatched: ${gestures}; \"Dispatch event\" lines: ${dispatched} (${folded_dispatch} of them summaries); error lines: ${errors}"
+echo "log entries: ${entries} (${rate} a second; ${lines} lines on standard error); events dispatched: ${gestures}; \"Dispatch event\" lines: ${dispatched} (${folded_dispatch} of them summaries); error lines: ${errors}"
 echo "lines by format (first words):"
-sed -E 's/ \([0-9]+ lines like this.*//; s/[0-9]+/N/g' "$work/log.txt" | cut -c1-60 | sort | uniq -c | sort -rn | head -12
+grep '^\[' "$work/log.txt" | sed -E 's/ \([0-9]+ lines like this.*//; s/[0-9]+/N/g' | cut -c1-60 | sort | uniq -c | sort -rn | head -12
