@@ -1,12 +1,14 @@
 #include "daemon/ContextHIDDevice.h"
 
 #include "common/Reports.h"
+#include "daemon/WatchHub.h"
 #include "platform/Log.h"
 
 namespace TolkaTouch {
 
-ContextHIDDevice::ContextHIDDevice(HIDDeviceRef inner, std::string node, uint32_t service)
-    : _inner(std::move(inner)), _node(std::move(node)), _service(service) {}
+ContextHIDDevice::ContextHIDDevice(HIDDeviceRef inner, std::string node, uint32_t service,
+                                   std::shared_ptr<WatchHub> watch)
+    : _inner(std::move(inner)), _node(std::move(node)), _service(service), _watch(std::move(watch)) {}
 
 void ContextHIDDevice::registerInputReportCallback(uint8_t* buffer, size_t length, InputReportCallback callback,
                                                    void* context) {
@@ -25,6 +27,7 @@ void ContextHIDDevice::registerInputReportCallback(uint8_t* buffer, size_t lengt
 void ContextHIDDevice::deliver(void* context, uint32_t result, void* sender, HIDReportType type, uint32_t reportID,
                                const uint8_t* report, size_t length, uint64_t timestamp) {
     auto* self = static_cast<ContextHIDDevice*>(context);
+    if (self->_watch && self->_watch->active()) self->_watch->report(self->_service, report, length);
     LogContext logContext{self->_node, self->_service, std::nullopt};
     if (auto image = InputReport::Image::parse(report, length)) logContext.frame = image->frameNumber;
     SystemLog::setThreadContext(std::move(logContext));

@@ -4,15 +4,19 @@
 // the report's frame number, so that every line written about the report carries them.
 
 #include <cstdint>
+#include <memory>
 #include <string>
 
 #include "platform/HIDDevice.h"
 
 namespace TolkaTouch {
 
+class WatchHub;
+
 class ContextHIDDevice : public HIDDevice {
 public:
-    ContextHIDDevice(HIDDeviceRef inner, std::string node, uint32_t service);
+    // `watch`, when given, also gets every input report while anyone watches.
+    ContextHIDDevice(HIDDeviceRef inner, std::string node, uint32_t service, std::shared_ptr<WatchHub> watch = nullptr);
 
     uint32_t open(uint32_t options) override { return _inner->open(options); }
     uint32_t close(uint32_t options) override { return _inner->close(options); }
@@ -42,6 +46,7 @@ private:
     HIDDeviceRef _inner;
     std::string _node;
     uint32_t _service;
+    std::shared_ptr<WatchHub> _watch;
     // Set only while no report is in flight (registration waits for a callback that runs).
     InputReportCallback _callback = nullptr;
     void* _context = nullptr;

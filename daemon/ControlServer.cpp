@@ -25,6 +25,8 @@ struct ControlServer::Client {
     std::size_t outputOffset = 0;
     bool wantsWrite = false;
     bool closing = false;  // the peer stopped writing; leave once the replies are out
+    bool subscribed = false;  // gets every pushed line
+    uint64_t dropped = 0;     // pushed lines it had no room for, not yet told
 };
 
 namespace {
@@ -224,7 +226,9 @@ void ControlServer::serve(Client& client) {
             if (client.discarding) {
                 client.discarding = false;
             } else {
+                _current = client.fd;
                 client.output += _handler(client.input);
+                _current = -1;
                 client.output += '\n';
                 --budget;
             }
@@ -318,6 +322,42 @@ void ControlServer::drop(int fd) {
     ::epoll_ctl(_epollFd, EPOLL_CTL_DEL, fd, nullptr);
     ::close(fd);
     _clients.erase(fd);
+}
+
+void ControlServer::subscribe(int client) {
+    auto it = _clients.find(client);
+    if (it != _clients.end()) it->second->subscribed = true;
+}
+
+std::size_t ControlServer::subscriberCount() const {
+    std::size_t count = 0;
+    for (const auto& [fd, client] : _clients) count += client->subscribed && !client->closing;
+    return count;
+}
+
+void ControlServer::push(const std::vector<std::string>& lines) {
+    std::vector<int> subscribers;
+    for (const auto& [fd, client] : _clients) {
+        if (client->subscribed) subscribers.push_back(fd);
+    }
+    for (int fd : subscribers) {
+        Client& client = *_clients.at(fd);
+        for (const std::string& line : lines) {
+            // A subscriber that reads slowly loses lines, never holds up the daemon: it is told
+            // how many once it has room again.
+            if (client.output.size() - client.outputOffset + line.size() > kMaxSubscriberBacklog) {
+                ++client.dropped;
+                continue;
+            }
+            if (client.dropped > 0) {
+                client.output += "{\"dropped\":" + std::to_string(client.dropped) + "}\n";
+                client.dropped = 0;
+            }
+            client.output += line;
+            client.output += '\n';
+        }
+        writeTo(client);
+    }
 }
 
 }  // namespace TolkaTouch

@@ -13,6 +13,7 @@
 #include <memory>
 #include <set>
 #include <string>
+#include <vector>
 
 namespace TolkaTouch {
 
@@ -50,6 +51,16 @@ public:
 
     std::size_t clientCount() const { return _clients.size(); }
 
+    // Subscribers: clients that, after their replies, get every line the daemon pushes (what
+    // `tolkatouch watch` follows). A subscriber whose unread lines pass kMaxSubscriberBacklog bytes
+    // loses the next ones, and is told how many ({"dropped": N}) before the first it gets again.
+    static constexpr std::size_t kMaxSubscriberBacklog = 1024 * 1024;
+    // The client whose request the handler is answering; -1 outside the handler.
+    int currentClient() const { return _current; }
+    void subscribe(int client);
+    std::size_t subscriberCount() const;
+    void push(const std::vector<std::string>& lines);
+
 private:
     struct Client;
     void accept();
@@ -63,6 +74,7 @@ private:
     void acceptWithoutDescriptors();
 
     std::string _path;
+    int _current = -1;
     Handler _handler;
     OversizeReply _oversizeReply;
     int _lockFd = -1;

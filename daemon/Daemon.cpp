@@ -23,6 +23,7 @@
 #include "daemon/Signals.h"
 #include "daemon/SimulationFeeder.h"
 #include "daemon/UinputKeyOutput.h"
+#include "daemon/WatchHub.h"
 #include "tolkatouch/Gesture.h"
 #include "platform/HIDServiceRegistry.h"
 #include "platform/HidrawDevice.h"
@@ -96,6 +97,7 @@ Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
     const itimerspec everySecond{{1, 0}, {1, 0}};
     ::timerfd_settime(_logTimerFd, 0, &everySecond, nullptr);
 
+    _watch = std::make_shared<WatchHub>();
     _loop = RunLoop::current();
     _eventQueue = DispatchQueue::create("tolkatouchd.events");
 }
@@ -136,7 +138,14 @@ void Daemon::addSources() {
         [[maybe_unused]] ssize_t got = ::read(_logTimerFd, &expirations, sizeof(expirations));
         SystemLog::flushFolded();
     });
-    _loop->addSource(_control->pollFd(), kLoopMode, [this] { _control->handleReady(); });
+    _loop->addSource(_control->pollFd(), kLoopMode, [this] {
+        _control->handleReady();
+        if (_watching && _control->subscriberCount() == 0) stopWatching();
+    });
+    _loop->addSource(_watch->pollFd(), kLoopMode, [this] {
+        _control->push(_watch->take());
+        if (_watching && _control->subscriberCount() == 0) stopWatching();
+    });
     if (_discovery) {
         _loop->addSource(_discovery->pollFd(), kLoopMode, [this] {
             _discovery->handleReady([this](const HidrawNode& node) { addHidrawNode(node); },
@@ -206,7 +215,7 @@ void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDD
     uint32_t service = _nextService++;
     // The service's start asks the registry for its device: it gets the handle opened here, which
     // names the device and the frame in every log line written while one of its reports is handled.
-    HIDDeviceRef logged = std::make_shared<ContextHIDDevice>(handle, node, service);
+    HIDDeviceRef logged = std::make_shared<ContextHIDDevice>(handle, node, service, _watch);
     HIDServiceRegistry::registerService(service, [logged] { return logged; });
     // Runs on the service's input report thread, which must not tear itself down: hand over.
     handle->setRemovalHandler([this, service] {
@@ -272,6 +281,7 @@ void Daemon::eventCallback(void* target, void* refcon, void*, const HIDEventRef&
 }
 
 void Daemon::handleEvent(uint32_t service, const HIDEvent& event) {
+    if (_watch->active()) _watch->event(GestureCodec::jsonLine(event));
     if (_options.print) {
         std::string line = GestureCodec::jsonLine(event);
         line += '\n';
@@ -377,6 +387,32 @@ std::optional<bool> Daemon::setProperty(std::optional<uint32_t> service, const s
     _log.log("setting %s = %s %s (service %u)", key.c_str(), value.description().c_str(), taken ? "taken" : "refused",
              device->service);
     return taken;
+}
+
+bool Daemon::startWatching() {
+    _control->subscribe(_control->currentClient());
+    if (_watching) return true;
+    // The description lines are the recognizer's debug lines: on while anyone watches, then back
+    // to the level they had, also when the watcher is killed.
+    const auto levels = SystemLog::minimumLevels();
+    auto it = levels.find(kWatchedCategory);
+    if (it == levels.end()) it = levels.find("*");
+    _levelBeforeWatching = SystemLog::levelFromName(it->second).value_or(static_cast<int>(LogLevel::Default));
+    SystemLog::setMinimumLevel(static_cast<int>(LogLevel::Debug), kWatchedCategory);
+    SystemLog::setObserver(_watch);
+    _watch->setActive(true);
+    _watching = true;
+    _log.log("watched: the %s debug level is on while anyone watches", kWatchedCategory);
+    return true;
+}
+
+void Daemon::stopWatching() {
+    _watch->setActive(false);
+    SystemLog::setObserver(nullptr);
+    SystemLog::setMinimumLevel(_levelBeforeWatching, kWatchedCategory);
+    _watching = false;
+    _watch->take();
+    _log.log("no longer watched: the %s level is %s again", kWatchedCategory, SystemLog::levelName(_levelBeforeWatching));
 }
 
 }  // namespace TolkaTouch

@@ -33,6 +33,7 @@ class PluginLibrary;
 class RunLoop;
 class SimulatedHIDDevice;
 class SimulationFeeder;
+class WatchHub;
 struct HidrawNode;
 
 struct DaemonOptions {
@@ -67,6 +68,7 @@ public:
     // ControlTarget
     std::vector<ControlDeviceInfo> devices() override;
     std::optional<PropertyValue> getProperty(std::optional<uint32_t> service, const std::string& key) override;
+    bool startWatching() override;
     std::optional<bool> setProperty(std::optional<uint32_t> service, const std::string& key,
                                     const PropertyValue& value) override;
 
@@ -106,6 +108,12 @@ private:
     int _signalFd = -1;
     int _timerFd = -1;
     int _logTimerFd = -1;
+    // `tolkatouch watch`: the live lines, and the watched category's level to go back to.
+    static constexpr const char* kWatchedCategory = "Algs";
+    std::shared_ptr<WatchHub> _watch;
+    bool _watching = false;
+    int _levelBeforeWatching = 0;
+    void stopWatching();
 
     std::map<uint32_t, std::unique_ptr<Device>> _devices;
     uint32_t _nextService = 1;
