@@ -166,6 +166,7 @@ struct SinkState {
     std::mutex mutex;
     std::shared_ptr<LogSink> custom;
     bool customGuarded = false;
+    bool automaticGuarded = false;  // a service turns the guard on; a tool prints every line
     std::shared_ptr<LogSink> observer;
     std::atomic<bool> observed{false};
     // The rate guard, its rates, and the last folded line of each format (for a summary written
@@ -188,7 +189,7 @@ struct SinkState {
     std::pair<std::shared_ptr<LogSink>, bool> current() {
         std::lock_guard lock(mutex);
         if (custom) return {custom, customGuarded};
-        return {automatic(), true};
+        return {automatic(), automaticGuarded};
     }
 
     std::shared_ptr<LogSink> automatic() {
@@ -484,6 +485,12 @@ void setSink(std::shared_ptr<LogSink> sink, bool rateGuarded) {
     std::lock_guard lock(state.mutex);
     state.custom = std::move(sink);
     state.customGuarded = rateGuarded;
+}
+
+void setRateGuarded(bool guarded) {
+    auto& state = SinkState::shared();
+    std::lock_guard lock(state.mutex);
+    state.automaticGuarded = guarded;
 }
 
 void setDefaultDestination(Destination destination) {

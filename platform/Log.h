@@ -4,8 +4,8 @@
 // error, fault, or off), set from a configuration, the command line or at run time. Whether a
 // level is on is one atomic load, so callers test it before building costly text. Lines go to the
 // journal when running as a service, to standard error otherwise, or to a sink a test installs.
-// On the way to the journal or standard error a rate guard per message format (LogRateGuard)
-// folds a format that repeats quickly into one summary line a second.
+// On the way to the journal or standard error of a service a rate guard per message format
+// (LogRateGuard) folds a format that repeats quickly into one summary line a second.
 
 #include <atomic>
 #include <cstdint>
@@ -169,6 +169,10 @@ std::optional<LogRateRule> parseRateLine(const std::string& text);
 // The calling thread's context, given to each line it writes until changed.
 void setThreadContext(LogContext context);
 void clearThreadContext();
+
+// Whether the rate guard stands before the journal and standard error: off until a service turns
+// it on (a tool asked for every description line prints them all).
+void setRateGuarded(bool guarded);
 
 enum class Destination { Automatic, Journal, StandardError };
 void setDefaultDestination(Destination destination);
