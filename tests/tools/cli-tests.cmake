@@ -148,3 +148,7 @@ tolka_add_cli_test(ShowSummaryCountsImagesFirmwareEventsAndSettings
 tolka_add_cli_test(ShowSummaryOfATimeRangeAsJsonCountsOnlyThatRange
   --stdout ${expected}/reset-during-hold.summary-500-1500.json --stderr-empty
   -- show --summary --json --from 500 --to 1500 ${examples}/reset-during-hold.json)
+
+# devices without a daemon: udev's list, and a line that says no daemon answered.
+tolka_add_cli_test(DevicesWithoutADaemonSaysSoAndListsWhatUdevKnows
+  --exit 0 --stderr-contains "no daemon answers" -- devices --socket /nonexistent/tolkatouchd.sock --vendor 0000 --product 0000)
