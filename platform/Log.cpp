@@ -291,10 +291,10 @@ Log::Log(std::string subsystem, std::string category)
       _category(std::move(category)),
       _minimum(LevelTable::shared().level(_category)) {}
 
-void Log::write(LogLevel level, std::string message, std::source_location where) const {
+void Log::write(LogLevel level, std::string message, const char* file, unsigned line, const char* function) const {
     if (!enabled(level)) return;
     // The call site's file name stands for its format: one string per place in the source.
-    emit(level, LogFormat(where.file_name(), where), std::move(message));
+    emit(level, LogFormat(file, file, line, function), std::move(message));
 }
 
 std::string Log::formatUnchecked(const char* format, ...) {
@@ -308,9 +308,9 @@ std::string Log::formatUnchecked(const char* format, ...) {
 void Log::emit(LogLevel level, const LogFormat& format, std::string message) const {
     LogRecord record{_subsystem, _category, level, std::move(message)};
     record.format = format.text;
-    record.file = sourceRelative(format.where.file_name());
-    record.line = format.where.line();
-    record.function = format.where.function_name();
+    record.file = sourceRelative(format.file);
+    record.line = format.line;
+    record.function = format.function;
     record.context = threadContext;
     SinkState::shared().deliver(std::move(record));
 }

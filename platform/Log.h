@@ -13,7 +13,6 @@
 #include <memory>
 #include <mutex>
 #include <optional>
-#include <source_location>
 #include <string>
 #include <vector>
 
@@ -29,11 +28,16 @@ const char* logLevelName(LogLevel level);
 inline constexpr int kLogOff = static_cast<int>(LogLevel::Fault) + 1;
 
 // A printf-style format and the place in the source that wrote it (the caller's, not the log's).
+// The compiler's builtins stand in for std::source_location, which the clang of the fuzz build
+// does not have.
 struct LogFormat {
-    LogFormat(const char* format, std::source_location where = std::source_location::current())
-        : text(format), where(where) {}
+    LogFormat(const char* format, const char* file = __builtin_FILE(), unsigned line = __builtin_LINE(),
+              const char* function = __builtin_FUNCTION())
+        : text(format), file(file), line(line), function(function) {}
     const char* text;
-    std::source_location where;
+    const char* file;
+    unsigned line;
+    const char* function;
 };
 
 // What the host knows about the line's thread when it was written: the device whose report it is
@@ -107,8 +111,8 @@ public:
         if (enabled(LogLevel::Fault)) emit(LogLevel::Fault, format, formatUnchecked(format.text, args...));
     }
     // A line already formatted; its format, for the rate guard, is its call site.
-    void write(LogLevel level, std::string message,
-               std::source_location where = std::source_location::current()) const;
+    void write(LogLevel level, std::string message, const char* file = __builtin_FILE(),
+               unsigned line = __builtin_LINE(), const char* function = __builtin_FUNCTION()) const;
 
 private:
     static std::string formatUnchecked(const char* format, ...);
