@@ -22,7 +22,7 @@ _tolkatouch() {
                 return
             fi
             options="--socket --help" ;;
-        devices) options="--socket --json --help" ;;
+        devices) options="--socket --json --vendor --product --help" ;;
         log)
             if [[ $cur != -* ]]; then
                 if [[ $cword -eq 2 ]]; then
