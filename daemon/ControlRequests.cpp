@@ -92,6 +92,10 @@ std::string answerControlRequest(const std::string& line, ControlTarget& target)
         for (const auto& [category, name] : SystemLog::minimumLevels()) levels[category] = name;
         return dump(json{{"levels", levels}});
     }
+    if (auto it = request.find("watch"); it != request.end() && *it == true) {
+        if (!target.startWatching()) return error("this daemon has nothing to watch");
+        return dump(json{{"ok", true}});
+    }
     if (auto it = request.find("devices"); it != request.end() && *it == true) {
         auto list = json::array();
         for (const auto& device : target.devices()) {

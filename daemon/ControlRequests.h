@@ -5,6 +5,8 @@
 //   {"devices": true}            -> {"devices": [{"service": N, "node": PATH, "vendor": V, "product": P}]}
 //   {"log": true}                -> {"levels": {"*": LEVEL, CATEGORY: LEVEL, ...}}
 //   {"log": CATEGORY, "level": L} -> {"ok": true}  (CATEGORY "*" for every category)
+//   {"watch": true}              -> {"ok": true}, then the daemon's live lines (WatchHub.h) until
+//                                   the client leaves; the debug level of "Algs" is on meanwhile
 // "get" and "set" may name a device with "device": N (its service number); without it they go to
 // the first device. Anything else gets {"error": MESSAGE}.
 
@@ -33,6 +35,8 @@ public:
     virtual std::optional<PropertyValue> getProperty(std::optional<uint32_t> service, const std::string& key) = 0;
     virtual std::optional<bool> setProperty(std::optional<uint32_t> service, const std::string& key,
                                             const PropertyValue& value) = 0;
+    // Makes the asking client a subscriber of the live lines; false when there are none to give.
+    virtual bool startWatching() { return false; }
 };
 
 // One reply line (without its newline) for one request line.

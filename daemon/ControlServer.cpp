@@ -28,9 +28,14 @@ struct ControlServer::Client {
     std::string output;         // replies not yet written
     std::size_t outputOffset = 0;
     bool closing = false;  // the peer stopped writing; leave once the replies are out
+    bool subscribed = false;  // gets every pushed line
+    uint64_t dropped = 0;     // pushed lines it had no room for, not yet told
 };
 
 namespace {
+// The client a worker is answering, for the handler's subscribe().
+thread_local uint64_t tCurrentClient = 0;
+
 std::runtime_error systemError(const std::string& what) {
     return std::runtime_error(what + ": " + std::strerror(errno));
 }
@@ -285,16 +290,20 @@ void ControlServer::takeFinishedTurns() {
     uint64_t count;
     [[maybe_unused]] ssize_t got = ::read(_wakeFd, &count, sizeof(count));
     std::vector<Turn> finished;
+    std::set<uint64_t> subscribers;
     {
         std::lock_guard lock(_turnsMutex);
         finished.swap(_finishedTurns);
+        subscribers.swap(_newSubscribers);
     }
     for (Turn& turn : finished) {
         auto it = std::find_if(_clients.begin(), _clients.end(),
                                [&](const auto& entry) { return entry.second->id == turn.client; });
         if (it == _clients.end()) continue;  // it left while its requests were answered
         Client& client = *it->second;
+        // The reply that subscribed comes before the first pushed line.
         client.output += turn.replies;
+        if (subscribers.count(client.id)) client.subscribed = true;
         client.inTurn = false;
         serve(client);
     }
@@ -310,10 +319,12 @@ void ControlServer::work() {
             turn = std::move(_waitingTurns.front());
             _waitingTurns.pop_front();
         }
+        tCurrentClient = turn.client;
         for (const Request& request : turn.requests) {
             turn.replies += answer(request);
             turn.replies += '\n';
         }
+        tCurrentClient = 0;
         {
             std::lock_guard lock(_turnsMutex);
             _finishedTurns.push_back(std::move(turn));
@@ -333,6 +344,45 @@ std::string ControlServer::answer(const Request& request) const {
     }
     if (reply.size() > kMaxReplyLength) return replyTooLong(reply.size());
     return reply;
+}
+
+uint64_t ControlServer::currentClient() { return tCurrentClient; }
+
+void ControlServer::subscribe(uint64_t client) {
+    if (client == 0) return;
+    std::lock_guard lock(_turnsMutex);
+    _newSubscribers.insert(client);
+}
+
+std::size_t ControlServer::subscriberCount() const {
+    std::size_t count = 0;
+    for (const auto& [fd, client] : _clients) count += client->subscribed && !client->closing;
+    return count;
+}
+
+void ControlServer::push(const std::vector<std::string>& lines) {
+    std::vector<int> subscribers;
+    for (const auto& [fd, client] : _clients) {
+        if (client->subscribed) subscribers.push_back(fd);
+    }
+    for (int fd : subscribers) {
+        Client& client = *_clients.at(fd);
+        for (const std::string& line : lines) {
+            // A subscriber that reads slowly loses lines, never holds up the daemon: it is told
+            // how many once it has room again.
+            if (client.output.size() - client.outputOffset + line.size() > kMaxSubscriberBacklog) {
+                ++client.dropped;
+                continue;
+            }
+            if (client.dropped > 0) {
+                client.output += "{\"dropped\":" + std::to_string(client.dropped) + "}\n";
+                client.dropped = 0;
+            }
+            client.output += line;
+            client.output += '\n';
+        }
+        writeTo(client);
+    }
 }
 
 void ControlServer::writeTo(Client& client) {

@@ -6,7 +6,8 @@
 // (and the key output on it) nor the other clients. A client that connects and never writes,
 // writes half a line and leaves, or never reads its replies, costs a descriptor and a bounded
 // buffer, and never holds up the daemon. Lines longer than kMaxLineLength get an error reply, and
-// so does a request whose reply would be longer than kMaxReplyLength.
+// so does a request whose reply would be longer than kMaxReplyLength. Clients may subscribe to the
+// lines the daemon pushes (what `tolkatouch watch` follows).
 
 #include <sys/types.h>
 
@@ -18,6 +19,7 @@
 #include <map>
 #include <memory>
 #include <mutex>
+#include <set>
 #include <string>
 #include <thread>
 #include <vector>
@@ -66,6 +68,18 @@ public:
     // The one-line reply that stands in for one longer than kMaxReplyLength.
     static std::string replyTooLong(std::size_t length);
 
+    // Subscribers: clients that, after their replies, get every line the daemon pushes. A
+    // subscriber whose unread lines pass kMaxSubscriberBacklog bytes loses the next ones, and is
+    // told how many ({"dropped": N}) before the first it gets again.
+    static constexpr std::size_t kMaxSubscriberBacklog = 1024 * 1024;
+    // The client whose request this thread's handler is answering; 0 outside the handler.
+    static uint64_t currentClient();
+    // From the handler: the client becomes a subscriber once its reply is out (any thread).
+    void subscribe(uint64_t client);
+    // From here on, the loop's side: who subscribes, and the lines they get.
+    std::size_t subscriberCount() const;
+    void push(const std::vector<std::string>& lines);
+
 private:
     struct Client;
     struct Request {
@@ -109,6 +123,7 @@ private:
     std::condition_variable _turnsReady;
     std::deque<Turn> _waitingTurns;   // in the order the clients became ready: round robin
     std::vector<Turn> _finishedTurns;
+    std::set<uint64_t> _newSubscribers;  // asked for by the handler, taken with the finished turns
     bool _stopping = false;
     std::vector<std::thread> _workers;
 };

@@ -13,6 +13,7 @@
 #include <stdexcept>
 
 #include "common/FeatureReports.h"
+#include "daemon/ContextHIDDevice.h"
 #include "daemon/ControlServer.h"
 #include "daemon/CountingHIDDevice.h"
 #include "daemon/DeviceDiscovery.h"
@@ -23,6 +24,7 @@
 #include "daemon/Signals.h"
 #include "daemon/SimulationFeeder.h"
 #include "daemon/UinputKeyOutput.h"
+#include "daemon/WatchHub.h"
 #include "tolkatouch/Gesture.h"
 #include "platform/HIDServiceRegistry.h"
 #include "platform/HidrawDevice.h"
@@ -90,7 +92,14 @@ Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
     if (_signalFd < 0) throw systemError("cannot take signals through a signalfd");
     _timerFd = ::timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
     if (_timerFd < 0) throw systemError("cannot create the key repeat timer");
+    // Once a second the log's rate guard writes the summaries of lines it folded, so that a burst
+    // that stops is still counted within a second.
+    _logTimerFd = ::timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
+    if (_logTimerFd < 0) throw systemError("cannot create the log timer");
+    const itimerspec everySecond{{1, 0}, {1, 0}};
+    ::timerfd_settime(_logTimerFd, 0, &everySecond, nullptr);
 
+    _watch = std::make_shared<WatchHub>();
     _loop = RunLoop::current();
     _eventQueue = DispatchQueue::create("tolkatouchd.events");
 }
@@ -110,6 +119,9 @@ Daemon::~Daemon() {
     if (_eventQueue) _eventQueue->sync([] {});
     if (_signalFd >= 0) ::close(_signalFd);
     if (_timerFd >= 0) ::close(_timerFd);
+    if (_logTimerFd >= 0) ::close(_logTimerFd);
+    // Lines the rate guard folded and has not summarised yet are counted before the daemon goes.
+    SystemLog::flushFolded(true);
 }
 
 int Daemon::run() {
@@ -127,7 +139,19 @@ int Daemon::run() {
 void Daemon::addSources() {
     _loop->addSource(_signalFd, kLoopMode, [this] { handleSignal(); });
     _loop->addSource(_timerFd, kLoopMode, [this] { handleRepeatTimer(); });
-    _loop->addSource(_control->pollFd(), kLoopMode, [this] { _control->handleReady(); });
+    _loop->addSource(_logTimerFd, kLoopMode, [this] {
+        uint64_t expirations;
+        [[maybe_unused]] ssize_t got = ::read(_logTimerFd, &expirations, sizeof(expirations));
+        SystemLog::flushFolded();
+    });
+    _loop->addSource(_control->pollFd(), kLoopMode, [this] {
+        _control->handleReady();
+        updateWatching();
+    });
+    _loop->addSource(_watch->pollFd(), kLoopMode, [this] {
+        _control->push(_watch->take());
+        updateWatching();
+    });
     if (_discovery) {
         _loop->addSource(_discovery->pollFd(), kLoopMode, [this] {
             _discovery->handleReady([this](const HidrawNode& node) { addHidrawNode(node); },
@@ -169,7 +193,8 @@ void Daemon::startDevices() {
         // A recorded setting follows the reports before it, as it did when it was recorded.
         _simulatedCounter->waitForDelivered(_simulatedWritten, [this] { return _feeder->stopRequested(); });
         if (_feeder->stopRequested()) return;
-        instance->setProperty("Pipeline." + key, value);
+        const bool taken = instance->setProperty("Pipeline." + key, value);
+        _log.log("setting Pipeline.%s = %s %s", key.c_str(), value.description().c_str(), taken ? "taken" : "refused");
     };
     target.finished = [this] { _simulated->simulateRemoval(); };
     _feeder->start(std::move(target));
@@ -194,8 +219,10 @@ void Daemon::addHidrawNode(const HidrawNode& node) {
 
 void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDDeviceRef handle) {
     uint32_t service = _nextService++;
-    // The service's start asks the registry for its device: it gets the handle opened here.
-    HIDServiceRegistry::registerService(service, [handle] { return handle; });
+    // The service's start asks the registry for its device: it gets the handle opened here, which
+    // names the device and the frame in every log line written while one of its reports is handled.
+    HIDDeviceRef logged = std::make_shared<ContextHIDDevice>(handle, node, service, _watch);
+    HIDServiceRegistry::registerService(service, [logged] { return logged; });
     // Runs on the service's input report thread, which must not tear itself down: hand over.
     handle->setRemovalHandler([this, service] {
         _loop->performBlock(kLoopMode, [this, service] { removeDevice(service, "the device went away"); });
@@ -266,6 +293,7 @@ void Daemon::eventCallback(void* target, void* refcon, void*, const HIDEventRef&
 }
 
 void Daemon::handleEvent(uint32_t service, const HIDEvent& event) {
+    if (_watch->active()) _watch->event(GestureCodec::jsonLine(event));
     if (_options.print) {
         std::string line = GestureCodec::jsonLine(event);
         line += '\n';
@@ -370,7 +398,44 @@ std::optional<bool> Daemon::setProperty(std::optional<uint32_t> service, const s
                                         const PropertyValue& value) {
     auto instance = findInstance(service);
     if (!instance) return std::nullopt;
-    return instance->setProperty(key, value);
+    const bool taken = instance->setProperty(key, value);
+    // Every change of a setting is in the journal, whoever made it.
+    _log.log("setting %s = %s %s (service %u)", key.c_str(), value.description().c_str(), taken ? "taken" : "refused",
+             instance->service());
+    return taken;
+}
+
+bool Daemon::startWatching() {
+    // Called by a control worker: the log levels change on the run loop, in updateWatching, once
+    // the subscription has been taken with the reply.
+    _control->subscribe(ControlServer::currentClient());
+    return true;
+}
+
+void Daemon::updateWatching() {
+    const bool watched = _control->subscriberCount() > 0;
+    if (watched == _watching) return;
+    if (!watched) {
+        _watch->setActive(false);
+        SystemLog::setObserver(nullptr);
+        SystemLog::setMinimumLevel(_levelBeforeWatching, kWatchedCategory);
+        _watching = false;
+        _watch->take();
+        _log.log("no longer watched: the %s level is %s again", kWatchedCategory,
+                 SystemLog::levelName(_levelBeforeWatching));
+        return;
+    }
+    // The description lines are the recognizer's debug lines: on while anyone watches, then back
+    // to the level they had, also when the watcher is killed.
+    const auto levels = SystemLog::minimumLevels();
+    auto it = levels.find(kWatchedCategory);
+    if (it == levels.end()) it = levels.find("*");
+    _levelBeforeWatching = SystemLog::levelFromName(it->second).value_or(static_cast<int>(LogLevel::Default));
+    SystemLog::setMinimumLevel(static_cast<int>(LogLevel::Debug), kWatchedCategory);
+    SystemLog::setObserver(_watch);
+    _watch->setActive(true);
+    _watching = true;
+    _log.log("watched: the %s debug level is on while anyone watches", kWatchedCategory);
 }
 
 }  // namespace TolkaTouch

@@ -34,6 +34,7 @@ class PluginLibrary;
 class RunLoop;
 class SimulatedHIDDevice;
 class SimulationFeeder;
+class WatchHub;
 struct HidrawNode;
 
 struct DaemonOptions {
@@ -68,6 +69,7 @@ public:
     // ControlTarget: called on the control socket's workers, while the run loop goes on.
     std::vector<ControlDeviceInfo> devices() override;
     std::optional<PropertyValue> getProperty(std::optional<uint32_t> service, const std::string& key) override;
+    bool startWatching() override;
     std::optional<bool> setProperty(std::optional<uint32_t> service, const std::string& key,
                                     const PropertyValue& value) override;
 
@@ -106,6 +108,14 @@ private:
     uint64_t _simulatedWritten = 0;  // reports written by the feeder (its thread only)
     int _signalFd = -1;
     int _timerFd = -1;
+    int _logTimerFd = -1;
+    // `tolkatouch watch`: the live lines, and the watched category's level to go back to.
+    static constexpr const char* kWatchedCategory = "Algs";
+    std::shared_ptr<WatchHub> _watch;
+    bool _watching = false;
+    int _levelBeforeWatching = 0;
+    // Turns the watched debug level and the live lines on or off as subscribers come and go.
+    void updateWatching();
 
     // Changed only on the run loop, under the lock, which the control socket's workers take to
     // look a device up.

@@ -48,7 +48,7 @@ void applyLogSettings(const LogSettings& settings) {
     }
     for (const std::string& item : settings.overrides) overrides += configurationLine(item);
     try {
-        SystemLog::applyConfiguration(overrides);
+        SystemLog::applyConfiguration(overrides, true);
     } catch (const std::invalid_argument&) {
         throw std::runtime_error("a log level override does not read (CATEGORY=LEVEL or LEVEL; levels debug, info, "
                                  "default, error, fault, off)");

@@ -78,6 +78,8 @@ int main(int argc, char** argv) {
     pthread_sigmask(SIG_BLOCK, &signals, nullptr);
     std::signal(SIGPIPE, SIG_IGN);
 
+    // A service's log is read by people: a message format that repeats quickly is folded.
+    TolkaTouch::SystemLog::setRateGuarded(true);
     TolkaTouch::DaemonOptions options;
     options.socketPath = defaultSocketPath();
     std::string vendor = hexId(TolkaTouch::SurfaceIds::kDefaultVendorId);

@@ -1,18 +1,29 @@
 #include "platform/Log.h"
 
+// The journal's fields CODE_FILE, CODE_LINE and CODE_FUNC are the caller's (LogRecord), not this file's.
+#define SD_JOURNAL_SUPPRESS_LOCATION
+#include <sys/uio.h>
 #include <systemd/sd-journal.h>
 #include <syslog.h>
 
 #include <algorithm>
+#include <cctype>
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <deque>
 #include <map>
 #include <sstream>
 #include <stdexcept>
+#include <unordered_map>
 
 #include "platform/Format.h"
+#include <time.h>
+
+#ifndef TOLKA_SOURCE_ROOT
+#define TOLKA_SOURCE_ROOT ""
+#endif
 
 namespace TolkaTouch {
 
@@ -110,9 +121,26 @@ int journalPriority(LogLevel level) {
 class JournalSink : public LogSink {
 public:
     void write(const LogRecord& record) override {
-        sd_journal_send("MESSAGE=%s", record.message.c_str(), "PRIORITY=%d", journalPriority(record.level),
-                        "TOLKATOUCH_SUBSYSTEM=%s", record.subsystem.c_str(), "TOLKATOUCH_CATEGORY=%s",
-                        record.category.c_str(), nullptr);
+        std::vector<std::string> fields;
+        fields.reserve(14);
+        fields.push_back("MESSAGE=" + record.message);
+        fields.push_back("PRIORITY=" + std::to_string(journalPriority(record.level)));
+        fields.push_back("SUBSYSTEM=" + record.subsystem);
+        fields.push_back("CATEGORY=" + record.category);
+        if (record.format) fields.push_back("MESSAGE_ID=" + SystemLog::messageId(record));
+        if (record.file) {
+            fields.push_back(std::string("CODE_FILE=") + record.file);
+            fields.push_back("CODE_LINE=" + std::to_string(record.line));
+            if (record.function) fields.push_back(std::string("CODE_FUNC=") + record.function);
+        }
+        if (!record.context.device.empty()) fields.push_back("DEVICE=" + record.context.device);
+        if (record.context.service) fields.push_back("SERVICE=" + std::to_string(*record.context.service));
+        if (record.context.frame) fields.push_back("FRAME=" + std::to_string(*record.context.frame));
+        if (record.folded) fields.push_back("FOLDED=" + std::to_string(record.folded));
+        std::vector<iovec> vector;
+        vector.reserve(fields.size());
+        for (std::string& field : fields) vector.push_back({field.data(), field.size()});
+        sd_journal_sendv(vector.data(), static_cast<int>(vector.size()));
     }
 };
 
@@ -128,9 +156,26 @@ private:
     std::mutex _mutex;
 };
 
+uint64_t monotonicNow() {
+    timespec now{};
+    clock_gettime(CLOCK_MONOTONIC, &now);
+    return static_cast<uint64_t>(now.tv_sec) * 1000000000ull + static_cast<uint64_t>(now.tv_nsec);
+}
+
 struct SinkState {
     std::mutex mutex;
     std::shared_ptr<LogSink> custom;
+    bool customGuarded = false;
+    bool automaticGuarded = false;  // a service turns the guard on; a tool prints every line
+    std::shared_ptr<LogSink> observer;
+    std::atomic<bool> observed{false};
+    // The rate guard, its rates, and the last folded line of each format (for a summary written
+    // after a quiet spell).
+    std::mutex guardMutex;
+    LogRateGuard guard;
+    std::vector<LogRateRule> rules;
+    std::unordered_map<const void*, LogRate> resolved;  // each format's rate, found once
+    std::unordered_map<const void*, LogRecord> lastFolded;
     SystemLog::Destination destination = SystemLog::Destination::Automatic;
     std::shared_ptr<LogSink> journal = std::make_shared<JournalSink>();
     std::shared_ptr<LogSink> standardError = std::make_shared<StandardErrorSink>();
@@ -140,9 +185,14 @@ struct SinkState {
         return state;
     }
 
-    std::shared_ptr<LogSink> current() {
+    // The sink and whether the rate guard stands before it.
+    std::pair<std::shared_ptr<LogSink>, bool> current() {
         std::lock_guard lock(mutex);
-        if (custom) return custom;
+        if (custom) return {custom, customGuarded};
+        return {automatic(), automaticGuarded};
+    }
+
+    std::shared_ptr<LogSink> automatic() {
         switch (destination) {
         case SystemLog::Destination::Journal: return journal;
         case SystemLog::Destination::StandardError: return standardError;
@@ -152,7 +202,87 @@ struct SinkState {
         static const bool underServiceManager = std::getenv("INVOCATION_ID") != nullptr;
         return underServiceManager ? journal : standardError;
     }
+
+    // The most particular rule that fits: a category's format start, then the category, then every
+    // category; the default when none does.
+    LogRate rateFor(const std::string& category, const char* format) const {
+        const LogRateRule* best = nullptr;
+        auto rank = [](const LogRateRule& rule) { return (rule.category.empty() ? 0 : 1) + (rule.formatStart.empty() ? 0 : 2); };
+        for (const LogRateRule& rule : rules) {
+            if (!rule.category.empty() && rule.category != category) continue;
+            if (!rule.formatStart.empty() && (!format || std::strncmp(format, rule.formatStart.c_str(), rule.formatStart.size()) != 0)) continue;
+            if (!best || rank(rule) >= rank(*best)) best = &rule;
+        }
+        return best ? best->rate : LogRate{};
+    }
+
+    LogRate resolvedRate(const LogRecord& record) {
+        auto it = resolved.find(record.format);
+        if (it == resolved.end()) it = resolved.emplace(record.format, rateFor(record.category, record.format)).first;
+        return it->second;
+    }
+
+    // Writes `record` through the rate guard (when it stands before the sink).
+    void deliver(LogRecord record) {
+        if (observed.load(std::memory_order_relaxed)) {
+            std::shared_ptr<LogSink> watcher;
+            {
+                std::lock_guard lock(mutex);
+                watcher = observer;
+            }
+            if (watcher) watcher->write(record);
+        }
+        auto [sink, guarded] = current();
+        if (guarded && record.format) {
+            std::lock_guard lock(guardMutex);
+            const LogRateGuard::Decision decision =
+                guard.admit(record.format, resolvedRate(record), monotonicNow(),
+                            static_cast<int>(record.level));
+            switch (decision.verdict) {
+            case LogRateGuard::Verdict::Write: break;
+            case LogRateGuard::Verdict::Fold: lastFolded[record.format] = std::move(record); return;
+            case LogRateGuard::Verdict::Summary:
+                record.message = foldedSummary(record.message, decision.folded, decision.seconds);
+                record.level = static_cast<LogLevel>(decision.level);
+                record.folded = decision.folded;
+                lastFolded.erase(record.format);
+                break;
+            }
+        }
+        sink->write(record);
+    }
+
+    void flush(bool everything) {
+        std::vector<LogRecord> summaries;
+        {
+            std::lock_guard lock(guardMutex);
+            for (const LogRateGuard::Pending& pending : guard.flush(monotonicNow(), everything)) {
+                auto it = lastFolded.find(pending.format);
+                if (it == lastFolded.end()) continue;
+                LogRecord record = std::move(it->second);
+                lastFolded.erase(it);
+                record.message = foldedSummary(record.message, pending.folded, pending.seconds);
+                record.level = static_cast<LogLevel>(pending.level);
+                record.folded = pending.folded;
+                summaries.push_back(std::move(record));
+            }
+        }
+        if (summaries.empty()) return;
+        auto sink = current().first;
+        for (const LogRecord& record : summaries) sink->write(record);
+    }
 };
+
+thread_local LogContext threadContext;
+
+// The source file as the tree names it, not the build machine's path.
+const char* sourceRelative(const char* file) {
+    static const size_t rootLength = std::strlen(TOLKA_SOURCE_ROOT);
+    if (rootLength > 0 && std::strncmp(file, TOLKA_SOURCE_ROOT, rootLength) == 0) return file + rootLength;
+    // A build directory inside the tree names sources relative to itself.
+    while (std::strncmp(file, "../", 3) == 0) file += 3;
+    return file;
+}
 
 }  // namespace
 
@@ -161,40 +291,80 @@ Log::Log(std::string subsystem, std::string category)
       _category(std::move(category)),
       _minimum(LevelTable::shared().level(_category)) {}
 
-void Log::write(LogLevel level, std::string message) const {
+void Log::write(LogLevel level, std::string message, const char* file, unsigned line, const char* function) const {
     if (!enabled(level)) return;
+    // The call site's file name stands for its format: one string per place in the source.
+    emit(level, LogFormat(file, file, line, function), std::move(message));
+}
+
+std::string Log::formatUnchecked(const char* format, ...) {
+    va_list args;
+    va_start(args, format);
+    std::string message = formatStringV(format, args);
+    va_end(args);
+    return message;
+}
+
+void Log::emit(LogLevel level, const LogFormat& format, std::string message) const {
     LogRecord record{_subsystem, _category, level, std::move(message)};
-    SinkState::shared().current()->write(record);
-}
-
-void Log::debug(const char* format, ...) const {
-    if (!debugEnabled()) return;
-    va_list args;
-    va_start(args, format);
-    std::string message = formatStringV(format, args);
-    va_end(args);
-    write(LogLevel::Debug, std::move(message));
-}
-
-void Log::log(const char* format, ...) const {
-    if (!enabled(LogLevel::Default)) return;
-    va_list args;
-    va_start(args, format);
-    std::string message = formatStringV(format, args);
-    va_end(args);
-    write(LogLevel::Default, std::move(message));
-}
-
-void Log::error(const char* format, ...) const {
-    if (!enabled(LogLevel::Error)) return;
-    va_list args;
-    va_start(args, format);
-    std::string message = formatStringV(format, args);
-    va_end(args);
-    write(LogLevel::Error, std::move(message));
+    record.format = format.text;
+    record.file = sourceRelative(format.file);
+    record.line = format.line;
+    record.function = format.function;
+    record.context = threadContext;
+    SinkState::shared().deliver(std::move(record));
 }
 
 namespace SystemLog {
+
+std::optional<LogRateRule> parseRateLine(const std::string& text) {
+    std::istringstream words(text);
+    std::vector<std::string> leading;
+    for (std::string word; leading.size() < 3 && words >> word;) leading.push_back(word);
+    auto isRate = [](const std::string& word) {
+        return word == "unlimited" || (!word.empty() && std::isdigit(static_cast<unsigned char>(word[0])));
+    };
+    if (leading.empty()) return std::nullopt;
+    LogRateRule rule;
+    size_t next = 0;
+    if (!isRate(leading[0])) {
+        rule.category = leading[0] == "*" ? std::string() : leading[0];
+        next = 1;
+    }
+    if (next >= leading.size()) return std::nullopt;
+    size_t used = next + 1;
+    if (leading[next] == "unlimited") {
+        rule.rate = LogRate{0, 0, true};
+    } else {
+        if (next + 1 >= leading.size()) return std::nullopt;
+        try {
+            size_t burstEnd = 0, rateEnd = 0;
+            const unsigned long burst = std::stoul(leading[next], &burstEnd);
+            const double perSecond = std::stod(leading[next + 1], &rateEnd);
+            if (burstEnd != leading[next].size() || rateEnd != leading[next + 1].size() || burst < 1 ||
+                burst > 1000000 || !(perSecond >= 0.001) || perSecond > 1e6) {
+                return std::nullopt;
+            }
+            rule.rate = LogRate{static_cast<uint32_t>(burst), perSecond, false};
+        } catch (const std::exception&) {
+            return std::nullopt;
+        }
+        used = next + 2;
+    }
+    // The rest of the line, spaces and all, is the start of the formats the rule is for.
+    std::istringstream again(text);
+    for (size_t i = 0; i < used; ++i) {
+        std::string skipped;
+        again >> skipped;
+    }
+    std::string rest;
+    std::getline(again, rest);
+    const size_t first = rest.find_first_not_of(" \t");
+    const size_t last = rest.find_last_not_of(" \t\r");
+    if (first != std::string::npos) rule.formatStart = rest.substr(first, last - first + 1);
+    if (!rule.formatStart.empty() && rule.category.empty()) return std::nullopt;  // a format is in one category
+    return rule;
+}
 
 void setDebugEnabled(bool enabled, const std::string& category) {
     LevelTable::shared().set(enabled ? kDebug : kDefault, category);
@@ -215,8 +385,9 @@ const char* levelName(int minimum) {
     return minimum >= kLogOff ? "off" : logLevelName(static_cast<LogLevel>(minimum));
 }
 
-void applyConfiguration(const std::string& text) {
+void applyConfiguration(const std::string& text, bool keepRates) {
     std::vector<std::pair<std::string, int>> settings;
+    std::vector<LogRateRule> rateSettings;
     std::istringstream lines(text);
     std::string line;
     for (int number = 1; std::getline(lines, line); ++number) {
@@ -224,6 +395,19 @@ void applyConfiguration(const std::string& text) {
         std::istringstream words(line);
         std::string category, level, extra;
         if (!(words >> category)) continue;
+        if (category == "rate") {
+            std::string rest;
+            std::getline(words, rest);
+            std::optional<LogRateRule> parsed = parseRateLine(rest);
+            if (!parsed) {
+                throw std::invalid_argument("line " + std::to_string(number) +
+                                            ": expected \"rate [CATEGORY] BURST PER_SECOND [FORMAT START]\" or "
+                                            "\"rate [CATEGORY] unlimited [FORMAT START]\" (BURST 1 to 1000000, "
+                                            "PER_SECOND 0.001 to 1000000; a format start needs a category)");
+            }
+            rateSettings.push_back(std::move(*parsed));
+            continue;
+        }
         const bool complete = static_cast<bool>(words >> level) && !(words >> extra);
         const std::optional<int> minimum = complete ? levelFromName(level) : std::nullopt;
         if (!minimum) {
@@ -236,12 +420,77 @@ void applyConfiguration(const std::string& text) {
     // "*" first, so that a line for one category is not undone by a later "*".
     std::stable_partition(settings.begin(), settings.end(), [](const auto& entry) { return entry.first.empty(); });
     for (const auto& [category, minimum] : settings) setMinimumLevel(minimum, category);
+    if (!keepRates) resetRates();
+    for (const LogRateRule& rule : rateSettings) setRate(rule);
 }
 
-void setSink(std::shared_ptr<LogSink> sink) {
+void setRate(const LogRateRule& rule) {
+    auto& state = SinkState::shared();
+    std::lock_guard lock(state.guardMutex);
+    state.resolved.clear();
+    // A later rule for the same category and format start replaces the earlier one.
+    std::erase_if(state.rules, [&](const LogRateRule& old) {
+        return old.category == rule.category && old.formatStart == rule.formatStart;
+    });
+    state.rules.push_back(rule);
+}
+
+LogRate rate(const std::string& category, const char* format) {
+    auto& state = SinkState::shared();
+    std::lock_guard lock(state.guardMutex);
+    return state.rateFor(category, format);
+}
+
+void resetRates() {
+    auto& state = SinkState::shared();
+    std::lock_guard lock(state.guardMutex);
+    state.rules.clear();
+    state.resolved.clear();
+}
+
+void flushFolded(bool everything) { SinkState::shared().flush(everything); }
+
+void setObserver(std::shared_ptr<LogSink> observer) {
+    auto& state = SinkState::shared();
+    std::lock_guard lock(state.mutex);
+    state.observed.store(observer != nullptr);
+    state.observer = std::move(observer);
+}
+
+void setThreadContext(LogContext context) { threadContext = std::move(context); }
+void clearThreadContext() { threadContext = LogContext{}; }
+
+std::string messageId(const LogRecord& record) {
+    // A stable 128-bit identifier of the message format: two 64-bit FNV-1a hashes of the
+    // subsystem, category and format text, so that it is the same in every build.
+    auto hash = [&](uint64_t seed) {
+        uint64_t value = seed;
+        auto mix = [&](const char* text) {
+            for (const char* c = text; *c; ++c) value = (value ^ static_cast<unsigned char>(*c)) * 0x100000001b3ull;
+            value = (value ^ 0xffu) * 0x100000001b3ull;
+        };
+        mix(record.subsystem.c_str());
+        mix(record.category.c_str());
+        mix(record.format ? record.format : "");
+        return value;
+    };
+    char text[33];
+    std::snprintf(text, sizeof text, "%016llx%016llx", static_cast<unsigned long long>(hash(0xcbf29ce484222325ull)),
+                  static_cast<unsigned long long>(hash(0x84222325cbf29ce4ull)));
+    return text;
+}
+
+void setSink(std::shared_ptr<LogSink> sink, bool rateGuarded) {
     auto& state = SinkState::shared();
     std::lock_guard lock(state.mutex);
     state.custom = std::move(sink);
+    state.customGuarded = rateGuarded;
+}
+
+void setRateGuarded(bool guarded) {
+    auto& state = SinkState::shared();
+    std::lock_guard lock(state.mutex);
+    state.automaticGuarded = guarded;
 }
 
 void setDefaultDestination(Destination destination) {

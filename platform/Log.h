@@ -4,15 +4,19 @@
 // error, fault, or off), set from a configuration, the command line or at run time. Whether a
 // level is on is one atomic load, so callers test it before building costly text. Lines go to the
 // journal when running as a service, to standard error otherwise, or to a sink a test installs.
+// On the way to the journal or standard error of a service a rate guard per message format
+// (LogRateGuard) folds a format that repeats quickly into one summary line a second.
 
+#include <atomic>
+#include <cstdint>
 #include <map>
 #include <memory>
-#include <optional>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <vector>
 
-#include <atomic>
+#include "platform/LogRateGuard.h"
 
 namespace TolkaTouch {
 
@@ -23,12 +27,49 @@ const char* logLevelName(LogLevel level);
 // A category's minimum level: the levels kept are this one and those above it; kLogOff keeps none.
 inline constexpr int kLogOff = static_cast<int>(LogLevel::Fault) + 1;
 
+// A printf-style format and the place in the source that wrote it (the caller's, not the log's).
+// The compiler's builtins stand in for std::source_location, which the clang of the fuzz build
+// does not have.
+struct LogFormat {
+    LogFormat(const char* format, const char* file = __builtin_FILE(), unsigned line = __builtin_LINE(),
+              const char* function = __builtin_FUNCTION())
+        : text(format), file(file), line(line), function(function) {}
+    const char* text;
+    const char* file;
+    unsigned line;
+    const char* function;
+};
+
+// What the host knows about the line's thread when it was written: the device whose report it is
+// handling (its node and service number) and the report's frame number. Empty when unknown.
+struct LogContext {
+    std::string device;
+    std::optional<uint32_t> service;
+    std::optional<uint64_t> frame;
+};
+
 struct LogRecord {
+    LogRecord() = default;
+    LogRecord(std::string subsystem, std::string category, LogLevel level, std::string message)
+        : subsystem(std::move(subsystem)), category(std::move(category)), level(level), message(std::move(message)) {}
+
     std::string subsystem;
     std::string category;
-    LogLevel level;
+    LogLevel level = LogLevel::Default;
     std::string message;
-    bool operator==(const LogRecord&) const = default;
+    // Where it came from, for the journal's fields; not part of what was logged.
+    const char* format = nullptr;
+    const char* file = nullptr;  // relative to the source tree when built in it
+    uint32_t line = 0;
+    const char* function = nullptr;
+    LogContext context;
+    uint64_t folded = 0;  // a summary of this many lines of its format (the rate guard's), else 0
+
+    // Equal when the same thing was logged: the same subsystem, category, level and text.
+    bool operator==(const LogRecord& other) const {
+        return subsystem == other.subsystem && category == other.category && level == other.level &&
+               message == other.message;
+    }
 };
 
 class LogSink {
@@ -48,12 +89,35 @@ public:
     bool debugEnabled() const { return enabled(LogLevel::Debug); }
 
     // printf-style; "%@" of the host's formats is written as "%s" with an object's description.
-    void debug(const char* format, ...) const __attribute__((format(printf, 2, 3)));
-    void log(const char* format, ...) const __attribute__((format(printf, 2, 3)));  // default level
-    void error(const char* format, ...) const __attribute__((format(printf, 2, 3)));
-    void write(LogLevel level, std::string message) const;
+    // Nothing is formatted for a level that is off.
+    template <typename... Args>
+    void debug(LogFormat format, Args... args) const {
+        if (enabled(LogLevel::Debug)) emit(LogLevel::Debug, format, formatUnchecked(format.text, args...));
+    }
+    template <typename... Args>
+    void info(LogFormat format, Args... args) const {
+        if (enabled(LogLevel::Info)) emit(LogLevel::Info, format, formatUnchecked(format.text, args...));
+    }
+    template <typename... Args>
+    void log(LogFormat format, Args... args) const {  // default level
+        if (enabled(LogLevel::Default)) emit(LogLevel::Default, format, formatUnchecked(format.text, args...));
+    }
+    template <typename... Args>
+    void error(LogFormat format, Args... args) const {
+        if (enabled(LogLevel::Error)) emit(LogLevel::Error, format, formatUnchecked(format.text, args...));
+    }
+    template <typename... Args>
+    void fault(LogFormat format, Args... args) const {
+        if (enabled(LogLevel::Fault)) emit(LogLevel::Fault, format, formatUnchecked(format.text, args...));
+    }
+    // A line already formatted; its format, for the rate guard, is its call site.
+    void write(LogLevel level, std::string message, const char* file = __builtin_FILE(),
+               unsigned line = __builtin_LINE(), const char* function = __builtin_FUNCTION()) const;
 
 private:
+    static std::string formatUnchecked(const char* format, ...);
+    void emit(LogLevel level, const LogFormat& format, std::string message) const;
+
     std::string _subsystem;
     std::string _category;
     const std::atomic<int>* _minimum;  // owned by the process-wide level table
@@ -76,13 +140,43 @@ std::map<std::string, std::string> minimumLevels();
 std::optional<int> levelFromName(const std::string& name);
 const char* levelName(int minimum);
 
-// Applies a log configuration: one "CATEGORY LEVEL" per line ("*" for every category), "#"
-// comments and blank lines allowed. Throws std::invalid_argument naming the first line that does
-// not read; nothing is applied then.
-void applyConfiguration(const std::string& text);
+// Applies a log configuration: one "CATEGORY LEVEL" per line ("*" for every category), and for
+// the rate guard "rate [CATEGORY] BURST PER_SECOND [FORMAT START]" or "rate [CATEGORY] unlimited
+// [FORMAT START]" (every category, one category, or the formats of one category that start with
+// the given text); "#" comments and blank lines allowed. Rates not given are the default (a burst
+// of 10, then 1 line a second per format). Throws std::invalid_argument naming the first line
+// that does not read; nothing is applied then. The rate rules replace those applied before, unless
+// `keepRates` (for overrides on top of a configuration file).
+void applyConfiguration(const std::string& text, bool keepRates = false);
+
+void setRate(const LogRateRule& rule);
+LogRate rate(const std::string& category, const char* format = nullptr);
+void resetRates();  // no rules: the default for every format
+
+// Writes the summaries of lines folded and not yet summarised: those due now (the host calls this
+// about once a second, so that a burst that stops is still counted soon), or all (at exit).
+void flushFolded(bool everything = false);
 
 // Where lines go: a sink of the caller's, or the default (journal or standard error) when null.
-void setSink(std::shared_ptr<LogSink> sink);
+// A sink of the caller's gets every line unless it asks for the rate guard.
+void setSink(std::shared_ptr<LogSink> sink, bool rateGuarded = false);
+
+// Sees every line the levels keep, before the rate guard (for live followers); null removes it.
+void setObserver(std::shared_ptr<LogSink> observer);
+
+// The journal's MESSAGE_ID of a line: the same for every line of one message format.
+std::string messageId(const LogRecord& record);
+
+// One "rate" line of the configuration after the word "rate", or nothing when it does not read.
+std::optional<LogRateRule> parseRateLine(const std::string& text);
+
+// The calling thread's context, given to each line it writes until changed.
+void setThreadContext(LogContext context);
+void clearThreadContext();
+
+// Whether the rate guard stands before the journal and standard error: off until a service turns
+// it on (a tool asked for every description line prints them all).
+void setRateGuarded(bool guarded);
 
 enum class Destination { Automatic, Journal, StandardError };
 void setDefaultDestination(Destination destination);

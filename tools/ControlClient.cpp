@@ -39,18 +39,25 @@ std::string defaultControlSocketPath() {
     return directory + "/tolkatouchd.sock";
 }
 
-nlohmann::json controlRequest(const std::string& socketPath, const nlohmann::json& request,
-                              const std::string& subject, double timeoutSeconds) {
+int connectControlSocket(const std::string& socketPath) {
     sockaddr_un address{};
     address.sun_family = AF_UNIX;
     if (socketPath.size() >= sizeof(address.sun_path)) throw ToolError(socketPath, "socket path too long");
     std::memcpy(address.sun_path, socketPath.c_str(), socketPath.size() + 1);
 
-    Socket socket(::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0));
-    if (socket.fd() < 0) throw ToolError(socketPath, std::strerror(errno));
-    if (::connect(socket.fd(), reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
-        throw ToolError(socketPath, std::string("cannot reach tolkatouchd: ") + std::strerror(errno));
+    const int fd = ::socket(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    if (fd < 0) throw ToolError(socketPath, std::strerror(errno));
+    if (::connect(fd, reinterpret_cast<sockaddr*>(&address), sizeof(address)) != 0) {
+        const int error = errno;
+        ::close(fd);
+        throw ToolError(socketPath, std::string("cannot reach tolkatouchd: ") + std::strerror(error));
     }
+    return fd;
+}
+
+nlohmann::json controlRequest(const std::string& socketPath, const nlohmann::json& request,
+                              const std::string& subject, double timeoutSeconds) {
+    Socket socket(connectControlSocket(socketPath));
 
     std::string line = request.dump(-1, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
     for (size_t sent = 0; sent < line.size();) {

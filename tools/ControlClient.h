@@ -16,6 +16,10 @@ namespace TolkaTouch::Tools {
 // the service), /run/tolkatouch/tolkatouchd.sock otherwise.
 std::string defaultControlSocketPath();
 
+// A connected stream socket to the daemon (the caller closes it). Throws ToolError naming the
+// socket when the daemon cannot be reached.
+int connectControlSocket(const std::string& socketPath);
+
 // Sends the request and answers the daemon's reply. Throws ToolError naming the socket when the
 // daemon cannot be reached or gives no reply within `timeoutSeconds`, and naming `subject` when
 // the reply is an error.

@@ -1,5 +1,7 @@
 // tolkatouch replay: plays a recording document through a fresh pipeline and prints its events.
 
+#include <unistd.h>
+
 #include <cstdio>
 #include <memory>
 #include <string>
@@ -13,6 +15,7 @@
 #include "tools/Commands.h"
 #include "tools/DocumentFile.h"
 #include "tools/EventPrinter.h"
+#include "tools/ReplayProgress.h"
 #include "tools/Replayer.h"
 #include "tools/SampleRecording.h"
 #include "tools/StatsPrinter.h"
@@ -38,12 +41,17 @@ PipelineRecording recordingToReplay(const std::string& document) {
 }
 
 void runReplay(const ReplayArguments& arguments) {
-    Replayer replayer(recordingToReplay(arguments.document));
+    PipelineRecording recording = recordingToReplay(arguments.document);
+    // Position and time left on a terminal, for a paced replay only.
+    ReplayProgress progress(recordingSeconds(recording), arguments.speed, !arguments.fast && ::isatty(STDERR_FILENO));
+    Replayer replayer(std::move(recording));
 
     ReplayOptions options;
     options.speed = arguments.speed;
     options.fast = arguments.fast;
-    options.onPauseCut = [](uint64_t microseconds) {
+    options.sleep = progress.sleeper();
+    options.onPauseCut = [&progress](uint64_t microseconds) {
+        progress.clear();
         std::fflush(stdout);
         std::fprintf(stderr, "tolkatouch: a pause of %.1f s in the recording is cut to %.0f s\n",
                      static_cast<double>(microseconds) / 1e6, static_cast<double>(kMaxReplayPauseMicroseconds) / 1e6);
@@ -60,6 +68,7 @@ void runReplay(const ReplayArguments& arguments) {
 
     // Lines go out as the events happen, also when standard output is a pipe.
     replayer.run(options, [&](const HIDEvent& event) {
+        progress.clear();
         const std::string line =
             arguments.json ? GestureCodec::jsonLine(event) : eventHumanLine(event, replayer.secondsSinceStart(event));
         std::fputs(line.c_str(), stdout);
@@ -67,6 +76,7 @@ void runReplay(const ReplayArguments& arguments) {
         if (!arguments.fast) std::fflush(stdout);
     });
 
+    progress.clear();
     if (arguments.stats) {
         const std::string stats = arguments.json ? statsJsonLine(replayer.pipeline()) + "\n" : statsTable(replayer.pipeline());
         std::fputs(stats.c_str(), stdout);

@@ -1,19 +1,20 @@
 #!/bin/bash
 # What tolkatouchd costs while a surface streams: the daemon runs the plug-in against the
-# simulated device fed at 125 frames per second for 30 seconds (3,750 image reports: the everyday
+# simulated device fed at 125 frames per second for 60 seconds (7,500 image reports: the everyday
 # example session over and over, paced at its recorded times), writing its keys to a key log,
-# under /usr/bin/time -v. Prints the CPU share of one core and the peak resident memory.
+# with the packaged log configuration (packaging/log.conf: its rate guard folds the per-frame
+# line), under /usr/bin/time -v. Prints the CPU share of one core and the peak resident memory.
 #
 #   bench/daemon/daemon_load.sh <tolkatouchd> <tolkatouch> <plug-in library> [seconds]
 #
-# Use a Release build of all three. The plug-in's per-frame log lines go to standard error,
-# which the script sends to /dev/null, as the journal would take them from a service.
+# Use a Release build of all three. The log's lines go to standard error, which the script sends
+# to /dev/null, as the journal would take them from a service.
 set -euo pipefail
 
 daemon=${1:?usage: $0 <tolkatouchd> <tolkatouch> <plug-in library> [seconds]}
 tolkatouch=${2:?usage: $0 <tolkatouchd> <tolkatouch> <plug-in library> [seconds]}
 plugin=${3:?usage: $0 <tolkatouchd> <tolkatouch> <plug-in library> [seconds]}
-seconds=${4:-30}
+seconds=${4:-60}
 frames=$(( seconds * 125 ))
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
@@ -24,7 +25,7 @@ actual=$(grep -c '"Type": "InputReport"' "$work/long.json")
 
 /usr/bin/time -v -o "$work/time.txt" \
   "$daemon" --simulate "$work/long.json" --plugin "$plugin" --socket "$work/tolkatouchd.sock" \
-  --key-log "$work/keys.log" > /dev/null 2> /dev/null
+  --key-log "$work/keys.log" --log-config "$(dirname "$0")/../../packaging/log.conf" > /dev/null 2> /dev/null
 
 field() { grep -F "$1" "$work/time.txt" | sed 's/.*: //'; }
 user=$(field "User time (seconds)")

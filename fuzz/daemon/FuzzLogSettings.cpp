@@ -1,11 +1,13 @@
 // Any bytes as the daemon's log settings: up to the first NUL byte the log configuration file's
 // text, after it the TOLKATOUCH_LOG value. Each is applied whole or refused with one line that
-// echoes no control character, and a refusal changes no level.
+// echoes no control character, and a refusal changes no level; then a line logged goes through
+// the levels and the rate guard the text set.
 
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <map>
+#include <memory>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -32,6 +34,11 @@ void expectKnownLevels() {
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    static const bool quiet = [] {
+        SystemLog::setSink(std::make_shared<SystemLog::MemorySink>(), true);
+        return true;
+    }();
+    (void)quiet;
     const std::string_view input(reinterpret_cast<const char*>(data), size);
     const size_t nul = input.find('\0');
     const std::string file(input.substr(0, nul));
@@ -45,6 +52,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         if (SystemLog::minimumLevels() != before) std::abort();
     }
     expectKnownLevels();
+    static const Log log("fuzz", "Algs");
+    log.log("Received image frame: %u", 1u);
+    SystemLog::flushFolded(true);
 
     // The environment's form, as the daemon takes it: no configuration file, then the variable.
     LogSettings settings;

@@ -355,5 +355,47 @@ TEST_F(ControlServerTest, SocketPathTooLongIsRefused) {
                  std::runtime_error);
 }
 
+TEST_F(ControlServerTest, OnlyASubscribedClientGetsPushedLinesAfterItsReply) {
+    server = std::make_unique<ControlServer>(
+        path,
+        [this](const std::string& line) {
+            if (line == "watch") server->subscribe(server->currentClient());
+            return "reply:" + line;
+        },
+        [] { return std::string("too long"); });
+    const int watcher = connectClient();
+    const int other = connectClient();
+    send(watcher, "watch\n");
+    EXPECT_EQ(receiveLines(watcher, 1), "reply:watch\n");
+    EXPECT_EQ(server->subscriberCount(), 1u);
+    server->push({"one", "two"});
+    EXPECT_EQ(receiveLines(watcher, 2), "one\ntwo\n");
+    send(other, "ask\n");
+    EXPECT_EQ(receiveLines(other, 1), "reply:ask\n");
+}
+
+TEST_F(ControlServerTest, ASubscriberThatDoesNotReadLosesLinesAndIsToldHowMany) {
+    server = std::make_unique<ControlServer>(
+        path,
+        [this](const std::string& line) {
+            server->subscribe(server->currentClient());
+            return "reply:" + line;
+        },
+        [] { return std::string("too long"); });
+    const int watcher = connectClient();
+    send(watcher, "watch\n");
+    EXPECT_EQ(receiveLines(watcher, 1), "reply:watch\n");
+    // Far more than the socket buffer and the backlog together: the rest is counted, not kept.
+    const std::string line(64 * 1024, 'x');
+    const size_t pushed = 2 * ControlServer::kMaxSubscriberBacklog / line.size() + 64;
+    for (size_t i = 0; i < pushed; ++i) server->push({line});
+    std::string text;
+    for (int turn = 0; turn < 400 && text.find("{\"dropped\":") == std::string::npos; ++turn) {
+        text += receiveLines(watcher, 1);
+        server->push({"after"});
+    }
+    EXPECT_NE(text.find("{\"dropped\":"), std::string::npos);
+}
+
 }  // namespace
 }  // namespace TolkaTouch

@@ -183,5 +183,114 @@ TEST_F(LogTest, RemovingTheSinkStopsRecording) {
     EXPECT_EQ(written, "[default] Algs: to standard error\n");
 }
 
+TEST_F(LogTest, ARateGuardedSinkGetsTheBurstThenOneSummaryOfTheRestAtFlush) {
+    SystemLog::setSink(sink, true);
+    const Log log(kSubsystem, "Guarded");
+    for (unsigned frame = 1; frame <= 15; ++frame) log.log("Received image frame: %u", frame);
+    EXPECT_EQ(sink->messages().size(), 10u);
+    SystemLog::flushFolded(true);
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 11u);
+    EXPECT_EQ(records.back().message.substr(0, 46), "Received image frame: 15 (5 lines like this in");
+    EXPECT_EQ(records.back().folded, 5u);
+}
+
+TEST_F(LogTest, FoldedErrorsAreSummarisedAtErrorLevel) {
+    SystemLog::setSink(sink, true);
+    const Log log(kSubsystem, "GuardedErrors");
+    for (unsigned frame = 1; frame <= 12; ++frame) log.error("Disjoint image (frame number: %u -> %u)", frame, frame + 2);
+    SystemLog::flushFolded(true);
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 11u);
+    EXPECT_EQ(records.back().level, LogLevel::Error);
+    EXPECT_EQ(records.back().folded, 2u);
+}
+
+TEST_F(LogTest, ARateRuleForAFormatStartLetsThatFormatThroughWhileOthersAreFolded) {
+    SystemLog::setSink(sink, true);
+    SystemLog::applyConfiguration("rate RuleCategory unlimited Dispatch event\n");
+    const Log log(kSubsystem, "RuleCategory");
+    for (int i = 0; i < 20; ++i) {
+        log.log("Dispatch event: %d", i);
+        log.log("Received image frame: %d", i);
+    }
+    SystemLog::resetRates();
+    size_t dispatched = 0;
+    for (const std::string& message : sink->messages()) dispatched += message.rfind("Dispatch event: ", 0) == 0;
+    EXPECT_EQ(dispatched, 20u);
+    EXPECT_EQ(sink->messages().size(), 30u);
+    SystemLog::flushFolded(true);
+}
+
+TEST_F(LogTest, RateLinesReadWithOrWithoutACategoryAndAFormatStart) {
+    EXPECT_EQ(SystemLog::parseRateLine(" 10 1"), (LogRateRule{"", "", LogRate{10, 1.0, false}}));
+    EXPECT_EQ(SystemLog::parseRateLine("Algs 5 0.5"), (LogRateRule{"Algs", "", LogRate{5, 0.5, false}}));
+    EXPECT_EQ(SystemLog::parseRateLine("HIDService unlimited Dispatch event"),
+              (LogRateRule{"HIDService", "Dispatch event", LogRate{0, 0, true}}));
+    EXPECT_EQ(SystemLog::parseRateLine("* unlimited"), (LogRateRule{"", "", LogRate{0, 0, true}}));
+    for (const char* bad : {"", "fast", "Algs", "Algs 10", "10 0", "0 1", "10 x", "unlimited Dispatch event", "Algs -1 1"}) {
+        EXPECT_FALSE(SystemLog::parseRateLine(bad)) << bad;
+    }
+}
+
+TEST_F(LogTest, ABadRateLineIsRefusedWithItsLineNumber) {
+    try {
+        SystemLog::applyConfiguration("* default\nrate ten 1\n");
+        FAIL() << "accepted";
+    } catch (const std::invalid_argument& error) {
+        EXPECT_EQ(std::string(error.what()).substr(0, 7), "line 2:");
+    }
+}
+
+TEST_F(LogTest, ARecordNamesTheCallersSourceLineAndFunction) {
+    const Log log(kSubsystem, "Where");
+    const unsigned line = __LINE__ + 1;
+    log.log("here");
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 1u);
+    EXPECT_STREQ(records[0].file, "tests/platform/LogTest.cpp");
+    EXPECT_EQ(records[0].line, line);
+    EXPECT_STREQ(records[0].function, "TestBody");
+}
+
+TEST_F(LogTest, TheMessageIdIsOneForEachFormatWhateverTheValues) {
+    const Log log(kSubsystem, "Ids");
+    for (int i = 0; i < 2; ++i) log.log("frame %d", i);
+    log.log("other %d", 1);
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 3u);
+    EXPECT_EQ(SystemLog::messageId(records[0]), SystemLog::messageId(records[1]));
+    EXPECT_NE(SystemLog::messageId(records[0]), SystemLog::messageId(records[2]));
+    EXPECT_EQ(SystemLog::messageId(records[0]).size(), 32u);
+}
+
+TEST_F(LogTest, TheThreadContextNamesTheDeviceServiceAndFrameUntilCleared) {
+    const Log log(kSubsystem, "Context");
+    SystemLog::setThreadContext(LogContext{"/dev/hidraw3", 2u, 1024u});
+    log.log("with");
+    SystemLog::clearThreadContext();
+    log.log("without");
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 2u);
+    EXPECT_EQ(records[0].context.device, "/dev/hidraw3");
+    EXPECT_EQ(records[0].context.service, 2u);
+    EXPECT_EQ(records[0].context.frame, 1024u);
+    EXPECT_TRUE(records[1].context.device.empty());
+    EXPECT_FALSE(records[1].context.frame);
+}
+
+TEST_F(LogTest, TheObserverSeesEveryLineTheRateGuardFolds) {
+    SystemLog::setSink(sink, true);
+    auto observer = std::make_shared<SystemLog::MemorySink>();
+    SystemLog::setObserver(observer);
+    const Log log(kSubsystem, "Observed");
+    for (int i = 0; i < 30; ++i) log.log("line %d", i);
+    SystemLog::setObserver(nullptr);
+    log.log("line %d", 30);
+    EXPECT_EQ(observer->messages().size(), 30u);
+    EXPECT_EQ(sink->messages().size(), 10u);
+    SystemLog::flushFolded(true);
+}
+
 }  // namespace
 }  // namespace TolkaTouch

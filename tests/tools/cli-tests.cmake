@@ -153,3 +153,14 @@ tolka_add_cli_test(ControlCharactersInAnErrorAreShownEscaped
   --exit 2 --stdout-empty
   --stderr-text "tolkatouch: unknown subcommand \"\\x1bcreplay\" (did you mean \"replay\"?)"
   -- "${escape}creplay")
+
+# show's time range, summary and JSON.
+tolka_add_cli_test(ShowSummaryCountsImagesFirmwareEventsAndSettings
+  --stdout ${expected}/reset-during-hold.summary.txt --stderr-empty -- show --summary ${examples}/reset-during-hold.json)
+tolka_add_cli_test(ShowSummaryOfATimeRangeAsJsonCountsOnlyThatRange
+  --stdout ${expected}/reset-during-hold.summary-500-1500.json --stderr-empty
+  -- show --summary --json --from 500 --to 1500 ${examples}/reset-during-hold.json)
+
+# devices without a daemon: udev's list, and a line that says no daemon answered.
+tolka_add_cli_test(DevicesWithoutADaemonSaysSoAndListsWhatUdevKnows
+  --exit 0 --stderr-contains "no daemon answers" -- devices --socket /nonexistent/tolkatouchd.sock --vendor 0000 --product 0000)
