@@ -4,8 +4,8 @@
 // Recorded settings are applied through the service's properties once every report recorded
 // before them has been handled. Reading and pacing a document is the recording's own playback,
 // so the document format and its timing live in one place; this is the daemon's one use of the
-// pipeline library, and nothing of the recognition runs here. The document is read a frame at a
-// time, so that a long recording costs the daemon only its frames.
+// pipeline library, and nothing of the recognition runs here. The recording (either form) is read
+// a frame at a time, so that a long recording costs the daemon only its frames.
 
 #include <atomic>
 #include <cstdint>
@@ -52,8 +52,7 @@ public:
     void stop();
 
 private:
-    static std::unique_ptr<PipelineRecording> readStreaming(const std::string& path);
-    static PipelineRecording readWhole(const std::string& path);
+    static std::unique_ptr<PipelineRecording> readFrames(const std::string& path);
     void run(Target target);
     void pause(uint64_t microseconds);
 

@@ -1,26 +1,23 @@
 // The recording document: writing (json), reading (construction from data) and the migration of
-// the older container layout.
+// the older container layout. The fast reading and the writing live in the Recording* files; the
+// general reader here decides whatever the fast one does not.
 
 #include <exception>
 #include <stdexcept>
 #include <string>
 #include <utility>
 
-#include <nlohmann/json.hpp>
-
 #include "pipeline/PipelineRecording.h"
-#include "platform/PropertyValueJson.h"
-#include "common/Util.h"
+#include "pipeline/RecordingDocumentReader.h"
+#include "pipeline/RecordingDocumentWriter.h"
+#include "pipeline/RecordingFrameJson.h"
+#include "pipeline/RecordingFrameReader.h"
 
 namespace TolkaTouch {
 
 namespace {
 
 constexpr uint64_t kCurrentVersion = 1;
-
-// A state value sits inside the document object, the "Frames" array and its frame object; what
-// it nests beyond the reader's limit is written as null.
-constexpr size_t kValueNestingDepth = PropertyValueJson::kMaxNestingDepth - 3;
 
 const std::string kTypeState = "State";
 const std::string kTypeInputReport = "InputReport";
@@ -29,76 +26,31 @@ const std::string kTypeInputReport = "InputReport";
 // (the writer turns it into hex text), so it is refused when a container comes from elsewhere.
 bool isDocumentValue(const PropertyValue& value) { return !value.isData(); }
 
-int hexDigitValue(char c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
-    return -1;
-}
-
-// Report text as the writer makes it ("01 0a ff ": two digits and one space per byte, the last
-// space optional) is decoded directly; reading a long recording spends most of its time here
-// otherwise. Any other text goes through the general hex reader, which gives the same bytes for
-// this form and decides everything else, errors included.
-std::vector<uint8_t> reportBytesFromHexText(const std::string& text) {
-    std::vector<uint8_t> bytes;
-    bytes.reserve(text.size() / 3 + 1);
-    for (size_t at = 0; at < text.size(); at += 3) {
-        const int high = hexDigitValue(text[at]);
-        const int low = at + 1 < text.size() ? hexDigitValue(text[at + 1]) : -1;
-        const bool separated = at + 2 >= text.size() || text[at + 2] == ' ';
-        if (high < 0 || low < 0 || !separated) return Util::bytesFromHexString(text);
-        bytes.push_back(static_cast<uint8_t>(high << 4 | low));
-    }
-    return bytes;
-}
-
 }  // namespace
 
 std::vector<uint8_t> PipelineRecording::json() {
     if (_maxFrameCount != 0) trim(_maxFrameCount);
-
-    nlohmann::ordered_json frames = nlohmann::ordered_json::array();
-    frames.get_ref<nlohmann::ordered_json::array_t&>().reserve(_frames.size());
-    for (const Frame& frame : _frames) {
-        nlohmann::ordered_json object = nlohmann::ordered_json::object();
-        switch (frame.type) {
-        case FrameType::InputReport:
-            object["Type"] = kTypeInputReport;
-            object["Timestamp"] = frame.timestamp;
-            object["Report"] = Util::hexStringFromBytes(frame.report);
-            break;
-        case FrameType::State:
-            object["Type"] = kTypeState;
-            object["Timestamp"] = frame.timestamp;
-            object["Key"] = frame.key;
-            if (frame.value) object["Value"] = PropertyValueJson::toJson(*frame.value, kValueNestingDepth);
-            break;
-        default:
-            continue;
-        }
-        frames.push_back(std::move(object));
-    }
-
-    nlohmann::ordered_json document = nlohmann::ordered_json::object();
-    document["Version"] = kCurrentVersion;
-    document["Frames"] = std::move(frames);
-    // Text that is not valid UTF-8 (a key set by a client) is replaced rather than refused: the
-    // writer has no failure path.
-    const std::string text = document.dump(4, ' ', false, nlohmann::ordered_json::error_handler_t::replace);
+    // Written a frame at a time, in the indented layout a tree's pretty-printer gives.
+    RecordingDocumentWriter writer(nullptr);
+    std::string& text = writer.text();
+    text.reserve(64 + _frames.size() * 300);
+    for (const Frame& frame : _frames) writer.writeFrame(frame);
+    writer.finish();
     return std::vector<uint8_t>(text.begin(), text.end());
 }
 
 PipelineRecording::PipelineRecording(const std::vector<uint8_t>* data) {
     if (data == nullptr) throw std::invalid_argument("json not supplied");
-    PropertyValue container;
-    try {
-        container = migrateSerializedContainer(PropertyValueJson::parse(data->data(), data->size()));
-    } catch (const std::exception& error) {
-        throw std::runtime_error(std::string("migrateSerializedContainer failed: ") + error.what());
-    }
     // Frames go straight into the list: no trimming, no clock, the document's time stamps kept.
-    _frames = framesFromContainer(container);
+    if (RecordingDocumentReader::isLinesForm(data->data(), data->size())) {
+        try {
+            _frames = RecordingFrameReader::fromBytes(*data)->readAll();
+        } catch (const RecordingReadError& error) {
+            error.rethrowPlain();
+        }
+        return;
+    }
+    _frames = RecordingDocumentReader::read(data->data(), data->size());
 }
 
 std::list<PipelineRecording::Frame> PipelineRecording::framesFromContainer(const PropertyValue& container) {
@@ -125,7 +77,8 @@ std::list<PipelineRecording::Frame> PipelineRecording::framesFromContainer(const
         } else if (*type->string() == kTypeInputReport) {
             const PropertyValue* report = element.find("Report");
             if (report == nullptr || !report->isString()) throw std::invalid_argument("invalid report");
-            frames.push_back(Frame::inputReport(timestamp->toUInt64(), reportBytesFromHexText(*report->string())));
+            frames.push_back(Frame::inputReport(timestamp->toUInt64(),
+                                                RecordingFrameJson::reportBytesFromHexText(*report->string())));
         } else {
             throw std::invalid_argument("invalid frame type");
         }

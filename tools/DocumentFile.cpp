@@ -4,9 +4,13 @@
 #include <cstdio>
 #include <cstring>
 #include <exception>
+#include <functional>
+#include <system_error>
 
 #include <fcntl.h>
 #include <unistd.h>
+
+#include "pipeline/RecordingDocumentReader.h"
 
 namespace TolkaTouch::Tools {
 
@@ -73,14 +77,64 @@ void writeFileBytes(const std::string& path, const std::vector<uint8_t>& bytes) 
     if (::close(fd) != 0) throw ToolError(path, systemReason(errno));
 }
 
-PipelineRecording recordingFromDocument(const std::vector<uint8_t>& document, const std::string& subject) {
+namespace {
+
+std::function<void(const std::string&)> warningsTo(const std::string& subject) {
+    return [subject](const std::string& message) {
+        std::fflush(stdout);
+        std::fprintf(stderr, "tolkatouch: %s: warning: %s\n", RecordingDocumentReader::escapeControl(subject).c_str(),
+                     RecordingDocumentReader::escapeControl(message).c_str());
+    };
+}
+
+[[noreturn]] void rethrowAsToolError(const std::string& subject) {
     try {
-        return PipelineRecording(&document);
+        throw;
+    } catch (const RecordingReadError& error) {
+        throw ToolError(subject, error.what(), error.detail());
+    } catch (const std::system_error& error) {
+        throw ToolError(subject, systemReason(error.code().value()));
     } catch (const std::exception& error) {
         throw ToolError(subject, error.what());
     }
 }
 
-PipelineRecording loadRecording(const std::string& path) { return recordingFromDocument(readFileBytes(path), path); }
+}  // namespace
+
+PipelineRecording recordingFromDocument(const std::vector<uint8_t>& document, const std::string& subject) {
+    PipelineRecording recording;
+    try {
+        auto reader = RecordingFrameReader::fromBytes(document, warningsTo(subject));
+        PipelineRecording::Frame frame;
+        while (reader->next(frame)) recording.appendFrame(std::move(frame));
+    } catch (...) {
+        rethrowAsToolError(subject);
+    }
+    return recording;
+}
+
+RecordingFile::RecordingFile(const std::string& path) : _path(path) {
+    try {
+        _reader = RecordingFrameReader::openFile(path, warningsTo(path));
+    } catch (...) {
+        rethrowAsToolError(path);
+    }
+}
+
+bool RecordingFile::next(PipelineRecording::Frame& frame) {
+    try {
+        return _reader->next(frame);
+    } catch (...) {
+        rethrowAsToolError(_path);
+    }
+}
+
+PipelineRecording loadRecording(const std::string& path) {
+    RecordingFile file(path);
+    PipelineRecording recording;
+    PipelineRecording::Frame frame;
+    while (file.next(frame)) recording.appendFrame(std::move(frame));
+    return recording;
+}
 
 }  // namespace TolkaTouch::Tools

@@ -72,6 +72,7 @@ int main(int argc, char** argv) {
     } catch (const ToolError& error) {
         std::fflush(stdout);
         std::fprintf(stderr, "tolkatouch: %s\n", printable(error.what()).c_str());
+        if (!error.detail().empty()) std::fprintf(stderr, "  %s\n", printable(error.detail()).c_str());
         return kExitFailure;
     } catch (const std::exception& error) {
         std::fflush(stdout);
