@@ -22,5 +22,7 @@ void addPropCommand(CLI::App& app);
 void addDevicesCommand(CLI::App& app);
 void addLogCommand(CLI::App& app);
 void addWatchCommand(CLI::App& app);
+void addEvalCommand(CLI::App& app);
+void addSweepCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools
