@@ -3,7 +3,7 @@
 _tolkatouch() {
     local cur prev words cword
     _init_completion || return
-    local subcommands="replay synth show convert uhid keys prop devices log watch"
+    local subcommands="replay synth show convert eval sweep uhid keys prop devices log watch"
     if [[ $cword -eq 1 ]]; then
         COMPREPLY=($(compgen -W "$subcommands --help --version" -- "$cur"))
         return
@@ -11,9 +11,11 @@ _tolkatouch() {
     local options=""
     case ${words[1]} in
         replay) options="--speed --fast --json --set --describe --stats --help" ;;
-        synth) options="--output --seed --help" ;;
+        synth) options="--output --seed --labels --finger --noise --help" ;;
         show) options="--frame --from --to --summary --json --raw --help" ;;
-        convert) options="--output --help" ;;
+        convert) options="--output --to --help" ;;
+        eval) options="--list --jobs --tolerance --set --json --shard --merge --help" ;;
+        sweep) options="--list --jobs --tolerance --set --grid --metric --json --csv --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)
@@ -36,7 +38,9 @@ _tolkatouch() {
         watch) options="--json --socket --help" ;;
     esac
     case $prev in
-        -o|--output|--socket|--uhid) _filedir; return ;;
+        -o|--output|--socket|--uhid|--list|--labels) _filedir; return ;;
+        --finger) COMPREPLY=($(compgen -W "light normal heavy" -- "$cur")); return ;;
+        --to) COMPREPLY=($(compgen -W "document lines" -- "$cur")); return ;;
     esac
     if [[ $cur == -* ]]; then
         COMPREPLY=($(compgen -W "$options" -- "$cur"))
