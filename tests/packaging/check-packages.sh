@@ -79,7 +79,8 @@ contents)
                 usr/include/tolkatouch/Gesture.h usr/include/tolkatouch/platform/HIDEvent.h \
                 "$libdir/pkgconfig/tolkatouch.pc" "$libdir/cmake/TolkaTouch/TolkaTouchConfig.cmake" \
                 usr/share/doc/libtolkatouch-dev/copyright \
-                usr/share/doc/libtolkatouch-dev/examples/embedding/CMakeLists.txt; do
+                usr/share/doc/libtolkatouch-dev/examples/embedding/CMakeLists.txt \
+                usr/share/doc/libtolkatouch-dev/examples/embedding/README.md; do
         has libtolkatouch-dev "$path"
     done
     # The unit starts the daemon the package holds; the configuration file is a conffile.
