@@ -113,6 +113,8 @@ file(MAKE_DIRECTORY ${CPACK_TOLKA_DEV_CONTROL_DIR})
 file(WRITE ${CPACK_TOLKA_DEV_CONTROL_DIR}/shlibs "libtolkatouch 0 libtolkatouch-dev (>= ${PROJECT_VERSION})\n")
 file(WRITE ${CPACK_TOLKA_DEV_CONTROL_DIR}/triggers "activate-noawait ldconfig\n")
 set(CPACK_POST_BUILD_SCRIPTS ${PROJECT_SOURCE_DIR}/cmake/FinishPackages.cmake)
+# Manual pages compressed, as Debian keeps them (gzip -9n), before the packages are made.
+set(CPACK_PRE_BUILD_SCRIPTS ${PROJECT_SOURCE_DIR}/cmake/CompressManPages.cmake)
 set(CPACK_DEBIAN_DEV_DESCRIPTION "TolkaTouch recognizer library - development files
 libtolkatouch is the TolkaTouch touch recognizer and its recording documents as
 one shared library, for programs that embed the recognizer: test rigs, other
