@@ -75,6 +75,14 @@ contents)
                 usr/share/doc/tolkatouch/examples/everyday-session.json; do
         has tolkatouch "$path"
     done
+    # Manual pages (compressed) and completions, from the install rules of packaging/man and
+    # packaging/completions.
+    if [ -d "$source/packaging/man" ]; then
+        for path in usr/share/man/man1/tolkatouch.1.gz usr/share/man/man8/tolkatouchd.8.gz \
+                    usr/share/bash-completion/completions/tolkatouch usr/share/bash-completion/completions/tolkatouchd; do
+            has tolkatouch "$path"
+        done
+    fi
     for path in "$libdir/libtolkatouch.so.0" "$libdir/libtolkatouch.so" usr/include/tolkatouch/RecordingReplay.h \
                 usr/include/tolkatouch/Gesture.h usr/include/tolkatouch/platform/HIDEvent.h \
                 "$libdir/pkgconfig/tolkatouch.pc" "$libdir/cmake/TolkaTouch/TolkaTouchConfig.cmake" \
