@@ -1,4 +1,4 @@
-#include "python/src/ArrayColumns.h"
+#include "ArrayColumns.h"
 
 namespace TolkaTouch::Python {
 

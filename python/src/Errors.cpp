@@ -1,4 +1,4 @@
-#include "python/src/Errors.h"
+#include "Errors.h"
 
 #include "tolkatouch/Settings.h"
 

@@ -3,10 +3,10 @@
 
 #include <pybind11/pybind11.h>
 
-#include "python/src/Errors.h"
-#include "python/src/RecordingBinding.h"
-#include "python/src/ReplayBinding.h"
-#include "python/src/SynthBinding.h"
+#include "Errors.h"
+#include "RecordingBinding.h"
+#include "ReplayBinding.h"
+#include "SynthBinding.h"
 
 PYBIND11_MODULE(_tolkatouch, module) {
     module.doc() = "The C++ side of the tolkatouch package; use the names tolkatouch exports.";

@@ -1,13 +1,14 @@
-#include "python/src/RecordingBinding.h"
+#include "RecordingBinding.h"
 
 #include <cstring>
 
 #include <pybind11/stl.h>
 
 #include "common/Reports.h"
-#include "python/src/ArrayColumns.h"
-#include "python/src/Errors.h"
 #include "tools/DocumentFile.h"
+
+#include "ArrayColumns.h"
+#include "Errors.h"
 
 namespace TolkaTouch::Python {
 

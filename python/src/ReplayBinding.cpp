@@ -1,4 +1,4 @@
-#include "python/src/ReplayBinding.h"
+#include "ReplayBinding.h"
 
 #include <memory>
 #include <string>
@@ -10,11 +10,12 @@
 
 #include "common/Util.h"
 #include "pipeline/Pipeline.h"
-#include "python/src/ArrayColumns.h"
-#include "python/src/RecordingBinding.h"
 #include "tolkatouch/FrameSnapshot.h"
 #include "tolkatouch/Gesture.h"
 #include "tolkatouch/Settings.h"
+
+#include "ArrayColumns.h"
+#include "RecordingBinding.h"
 
 namespace TolkaTouch::Python {
 

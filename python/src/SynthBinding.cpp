@@ -1,12 +1,13 @@
-#include "python/src/SynthBinding.h"
+#include "SynthBinding.h"
 
 #include <optional>
 #include <string>
 
-#include "python/src/Errors.h"
-#include "python/src/RecordingBinding.h"
 #include "tools/GestureScript.h"
 #include "tools/Synthesizer.h"
+
+#include "Errors.h"
+#include "RecordingBinding.h"
 
 namespace TolkaTouch::Python {
 
