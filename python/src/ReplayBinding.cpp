@@ -51,12 +51,20 @@ struct FrameColumns {
     std::vector<uint8_t> touching, aboveNoise, transition, holdSuppressed, holdClock, region;
 
     void reserve(size_t n) {
-        frame.reserve(n), time.reserve(n), hostTime.reserve(n), seconds.reserve(n);
-        readings.reserve(n * kPixelCount), pixelValues.reserve(n * kPixelCount);
-        normalized.reserve(n * kPixelCount), on.reserve(n * kPixelCount);
-        virtualValues.reserve(n * kVirtualPixelCount), virtualNormalized.reserve(n * kVirtualPixelCount);
+        frame.reserve(n);
+        time.reserve(n);
+        hostTime.reserve(n);
+        seconds.reserve(n);
+        readings.reserve(n * kPixelCount);
+        pixelValues.reserve(n * kPixelCount);
+        normalized.reserve(n * kPixelCount);
+        on.reserve(n * kPixelCount);
+        virtualValues.reserve(n * kVirtualPixelCount);
+        virtualNormalized.reserve(n * kVirtualPixelCount);
         virtualOn.reserve(n * kVirtualPixelCount);
-        for (auto* column : {&touchScore, &svmScore, &strengthRate, &strengthPerDuration, &durationRatio, &tapScore}) column->reserve(n);
+        for (auto* column : {&touchScore, &svmScore, &strengthRate, &strengthPerDuration, &durationRatio, &tapScore}) {
+            column->reserve(n);
+        }
         for (auto* column : {&activePixelCount, &sinceTouchStartMs, &touchLengthMs}) column->reserve(n);
         for (auto* column : {&touching, &aboveNoise, &transition, &holdSuppressed, &holdClock, &region}) column->reserve(n);
     }
