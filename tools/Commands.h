@@ -21,5 +21,8 @@ void addKeysCommand(CLI::App& app);
 void addPropCommand(CLI::App& app);
 void addDevicesCommand(CLI::App& app);
 void addLogCommand(CLI::App& app);
+void addEvalCommand(CLI::App& app);
+void addSweepCommand(CLI::App& app);
+void addPlotCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

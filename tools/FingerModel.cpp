@@ -51,7 +51,7 @@ T clampTo(double value) {
 
 }  // namespace
 
-FingerModel::FingerModel(uint64_t seed) : _random(seed) {
+FingerModel::FingerModel(uint64_t seed, double noiseDeviation) : _random(seed), _noiseDeviation(noiseDeviation) {
     for (double& baseline : _baseline) baseline = _random.uniform(1400.0, 2200.0);
 }
 
@@ -80,7 +80,7 @@ SensorReadings FingerModel::read(const std::optional<FingerContact>& contact) {
     for (size_t pixel = 0; pixel < kPixelCount; ++pixel) {
         // The baseline wanders by a fraction of a count per frame and is pulled back.
         _drift[pixel] = 0.98 * _drift[pixel] + _random.normal(0.3);
-        const double reading = scaled[pixel] / Algs::pixelGains[pixel] + _drift[pixel] + _random.normal(kNoiseDeviation);
+        const double reading = scaled[pixel] / Algs::pixelGains[pixel] + _drift[pixel] + _random.normal(_noiseDeviation);
         readings.pixels[pixel] = clampTo<int16_t>(reading);
         readings.rawPixels[pixel] = clampTo<uint16_t>(_baseline[pixel] + readings.pixels[pixel]);
     }

@@ -44,7 +44,8 @@ struct Pad {
 
 class FingerModel {
 public:
-    explicit FingerModel(uint64_t seed);
+    // noiseDeviation: the sensor noise's standard deviation, in signed counts.
+    explicit FingerModel(uint64_t seed, double noiseDeviation = kNoiseDeviation);
 
     // One frame's readings; each call draws new noise.
     SensorReadings read(const std::optional<FingerContact>& contact);
@@ -63,6 +64,7 @@ public:
 
 private:
     SeededRandom _random;
+    double _noiseDeviation = kNoiseDeviation;
     std::array<double, kPixelCount> _baseline{};  // raw reading with nothing on the surface
     std::array<double, kPixelCount> _drift{};     // slow wander of the baseline, in counts
 };

@@ -12,6 +12,10 @@ namespace {
 
 constexpr double kLongestDurationMs = 24.0 * 3600.0 * 1000.0;
 constexpr uint32_t kShortestSlideMs = 1000;
+// The finger model samples the surface every 8 ms: a touch shorter than two frames is not one.
+constexpr uint32_t kShortestTouchMs = 16;
+// A brush is a passing finger; one lingering longer is a touch the finger model does not make.
+constexpr uint32_t kLongestBrushMs = 400;
 // A longer script would make a document of gigabytes; an hour is already 450,000 frames.
 constexpr uint64_t kLongestScriptMs = 3600 * 1000;
 
@@ -87,6 +91,10 @@ Gesture parseLine(std::string_view line, int lineNumber) {
         gesture.kind = verb == "tap" ? GestureKind::Tap : verb == "hold" ? GestureKind::Hold : GestureKind::Brush;
         gesture.zone = zoneArgument(parts[1], lineNumber);
         gesture.durationMs = durationArgument(parts[2], lineNumber);
+        if (gesture.durationMs < kShortestTouchMs) fail(lineNumber, "a touch lasts at least 16ms (two frames)");
+        if (gesture.kind == GestureKind::Brush && gesture.durationMs > kLongestBrushMs) {
+            fail(lineNumber, "a brush lasts at most 400ms: a finger that stays longer touches");
+        }
     } else if (verb == "slide") {
         expectWords(parts, 4, lineNumber, "slide <zone> <zone> <duration>");
         gesture.kind = GestureKind::Slide;
@@ -198,6 +206,9 @@ GestureScript GestureScript::parse(std::string_view text) {
             const bool isTouch = previous != nullptr && previous->kind != GestureKind::Wait && previous->kind != GestureKind::Reset;
             if (!isTouch || gesture.durationMs >= previous->durationMs) {
                 fail(lineNumber, "a reset offset must fall inside the touch on a line before it");
+            }
+            if (previous->kind == GestureKind::Slide || previous->kind == GestureKind::Brush) {
+                fail(lineNumber, "a reset can fall inside a tap or a hold, not inside a slide or a brush");
             }
         }
         const bool takesTime = gesture.kind != GestureKind::Set && gesture.kind != GestureKind::Reset;

@@ -23,6 +23,10 @@ constexpr double kArrivalLatencyMaxUs = 700.0;
 // A deliberate fingertip: a firm press.
 constexpr double kPressStrength = 700.0;
 constexpr double kPressRadius = 2.0;
+constexpr double kLightPressScale = 0.75;
+constexpr double kLightPressRadius = 1.7;
+constexpr double kHeavyPressScale = 1.35;
+constexpr double kHeavyPressRadius = 2.4;
 constexpr double kRampMs = 24.0;          // contact builds up and fades over three frames
 constexpr double kSlideMoveMs = 96.0;     // a slide crosses to the other zone this quickly
 constexpr double kSlideHoldMs = 640.0;    // and only after being held this long
@@ -30,6 +34,10 @@ constexpr double kSlideHoldMs = 640.0;    // and only after being held this long
 constexpr double kBrushStrength = 300.0;
 constexpr double kBrushRadius = 2.6;
 constexpr double kBrushHoverLevel = 0.38;  // of the graze's strength: sensed, but not a touch
+// The graze lasts one frame period, so exactly one frame sees it, and comes at least four frame
+// periods after the finger is first sensed.
+constexpr double kShortestGrazingBrushMs = 64.0;
+constexpr double kGrazeBeforeLeavingMs = 14.0;
 
 struct Segment {
     const Gesture* gesture = nullptr;
@@ -39,6 +47,7 @@ struct Segment {
     SurfacePoint offset;
     double strength = 0.0;
     double wobblePhase = 0.0;
+    double radius = kPressRadius;
 };
 
 struct TimedItem {
@@ -75,22 +84,25 @@ std::optional<FingerContact> contactAt(const Segment& segment, double timeMs) {
     switch (gesture.kind) {
     case GestureKind::Tap:
     case GestureKind::Hold:
-        return FingerContact{home, segment.strength * wobble * pressEnvelope(u, duration), kPressRadius};
+        return FingerContact{home, segment.strength * wobble * pressEnvelope(u, duration), segment.radius};
     case GestureKind::Slide: {
         const SurfacePoint away = plus(FingerModel::zoneCentre(gesture.toZone), segment.offset);
         const double moveStart = std::max(kSlideHoldMs, (duration - kSlideMoveMs) / 2.0);
         const SurfacePoint where = between(home, away, smoothstep((u - moveStart) / kSlideMoveMs));
-        return FingerContact{where, segment.strength * wobble * pressEnvelope(u, duration), kPressRadius};
+        return FingerContact{where, segment.strength * wobble * pressEnvelope(u, duration), segment.radius};
     }
     case GestureKind::Brush: {
-        // Sweeps sideways across the zone: the finger hovers close enough to be sensed, grazes
-        // the surface for a moment and is gone.
-        const double t = u / duration;
-        const SurfacePoint where = plus(home, SurfacePoint{-1.5 + 3.0 * t, 0.0});
-        double level = kBrushHoverLevel * smoothstep(t / 0.12);
-        if (t > 0.8) level += (1.0 - kBrushHoverLevel) * smoothstep((t - 0.8) / 0.08);
-        level *= smoothstep((1.0 - t) / 0.12);
-        return FingerContact{where, segment.strength * level, kBrushRadius};
+        // The finger sweeps sideways across the zone just above it: sensed all the way, never
+        // pressing. A brush long enough to dip grazes the surface for less than a frame's time
+        // just before it leaves; the long sensed approach before that short contact is what the
+        // tap rejection turns down. A shorter one passes without ever reaching the surface.
+        const SurfacePoint where = plus(home, SurfacePoint{-1.5 + 3.0 * u / duration, 0.0});
+        double level = kBrushHoverLevel * smoothstep(u / kFramePeriodMs) * smoothstep((duration - u) / kFramePeriodMs);
+        const double grazeStart = duration - kGrazeBeforeLeavingMs;
+        if (duration >= kShortestGrazingBrushMs && u >= grazeStart && u < grazeStart + kFramePeriodMs) {
+            level = 1.0;
+        }
+        return FingerContact{where, segment.strength * level, segment.radius};
     }
     default:
         return std::nullopt;
@@ -124,9 +136,27 @@ uint64_t nanosecondsAt(double timeMs) { return kSynthesisStartNs + static_cast<u
 
 }  // namespace
 
-Synthesis synthesize(const GestureScript& script, uint64_t seed) {
+std::string_view fingerName(Finger finger) {
+    switch (finger) {
+    case Finger::Light: return "light";
+    case Finger::Normal: return "normal";
+    case Finger::Heavy: return "heavy";
+    }
+    return "";
+}
+
+std::optional<Finger> fingerFromName(std::string_view name) {
+    for (Finger finger : {Finger::Light, Finger::Normal, Finger::Heavy}) {
+        if (fingerName(finger) == name) return finger;
+    }
+    return std::nullopt;
+}
+
+Synthesis synthesize(const GestureScript& script, uint64_t seed, const SynthesisOptions& options) {
     SeededRandom random(seed);
-    FingerModel model(seed ^ 0x5eed5eed5eed5eedull);
+    FingerModel model(seed ^ 0x5eed5eed5eed5eedull, options.noiseDeviation);
+    const double pressScale = options.finger == Finger::Light ? kLightPressScale : options.finger == Finger::Heavy ? kHeavyPressScale : 1.0;
+    const double pressRadius = options.finger == Finger::Light ? kLightPressRadius : options.finger == Finger::Heavy ? kHeavyPressRadius : kPressRadius;
 
     // Lay the gestures out in time.
     std::vector<Segment> segments;
@@ -147,7 +177,8 @@ Synthesis synthesize(const GestureScript& script, uint64_t seed) {
             const double angle = random.uniform(0.0, 2.0 * std::numbers::pi);
             const double distance = random.uniform(0.0, 0.35);
             segment.offset = SurfacePoint{distance * std::cos(angle), distance * std::sin(angle)};
-            const double base = gesture.kind == GestureKind::Brush ? kBrushStrength : kPressStrength;
+            const double base = gesture.kind == GestureKind::Brush ? kBrushStrength : kPressStrength * pressScale;
+            segment.radius = gesture.kind == GestureKind::Brush ? kBrushRadius : pressRadius;
             segment.strength = base * random.uniform(0.9, 1.1);
             segment.wobblePhase = random.uniform(0.0, 2.0 * std::numbers::pi);
             segments.push_back(segment);

@@ -8,6 +8,8 @@
 // The same script and seed always give the same frames.
 
 #include <cstdint>
+#include <optional>
+#include <string_view>
 #include <vector>
 
 #include "pipeline/PipelineRecording.h"
@@ -31,7 +33,19 @@ struct Synthesis {
 inline constexpr uint64_t kSynthesisStartNs = 1'000'000'000'000;  // the host clock at the first frame
 inline constexpr uint32_t kFramePeriodMs = 8;
 
-Synthesis synthesize(const GestureScript& script, uint64_t seed);
+// How the finger presses: a light finger presses 0.75 times as firmly as a normal one with a
+// narrower tip, a heavy one 1.35 times as firmly with a wider tip. Brushes graze alike.
+enum class Finger { Light, Normal, Heavy };
+
+struct SynthesisOptions {
+    Finger finger = Finger::Normal;
+    double noiseDeviation = 2.0;  // the sensor noise, in signed counts
+};
+
+Synthesis synthesize(const GestureScript& script, uint64_t seed, const SynthesisOptions& options = {});
+
+std::string_view fingerName(Finger finger);  // "light", "normal", "heavy"
+std::optional<Finger> fingerFromName(std::string_view name);
 
 // The frames as a recording, ready to be written with json().
 PipelineRecording recordingFromSynthesis(const Synthesis& synthesis);

@@ -15,29 +15,15 @@
 #include "tolkatouch/Settings.h"
 #include "tolkatouch/VersionText.h"
 #include "tools/DocumentFile.h"
+#include "tools/PrintableText.h"
 
 namespace {
 
 constexpr int kExitFailure = 1;
 constexpr int kExitUsage = 2;
 
-// An error line may quote what came from outside (a path, a script's word, a document's text):
-// control characters are shown escaped, so that none reaches the terminal as a command.
-std::string printable(const std::string& text) {
-    std::string out;
-    for (const char c : text) {
-        const auto byte = static_cast<unsigned char>(c);
-        if (byte < 0x20 || byte == 0x7f) {
-            static constexpr char kDigits[] = "0123456789abcdef";
-            out += "\\x";
-            out += kDigits[byte >> 4];
-            out += kDigits[byte & 0xF];
-        } else {
-            out += c;
-        }
-    }
-    return out;
-}
+// An error line may quote what came from outside: shown with its control characters escaped.
+std::string printable(const std::string& text) { return TolkaTouch::Tools::printableText(text); }
 
 }  // namespace
 
@@ -58,6 +44,9 @@ int main(int argc, char** argv) {
     addPropCommand(app);
     addDevicesCommand(app);
     addLogCommand(app);
+    addEvalCommand(app);
+    addSweepCommand(app);
+    addPlotCommand(app);
 
     // A first word that names no subcommand is a typo far more often than anything else.
     if (argc > 1 && argv[1][0] != '-') {

@@ -11,7 +11,9 @@ set -euo pipefail
 tolkatouch=${1:?usage: $0 <path to tolkatouch>}
 examples=$(cd "$(dirname "$0")/../examples" && pwd)
 
-for script in everyday-session reset-during-hold; do
+# everyday-session.json is not regenerated: it is a golden input and the built-in sample, frozen as
+# the earlier finger model made its brushes (today's brushes are grazes the tap rejection turns down).
+for script in reset-during-hold; do
   "$tolkatouch" synth "$examples/$script.txt" -o "$examples/$script.json"
 done
 

@@ -71,6 +71,17 @@ TEST(GestureScriptTest, ResetWithOffsetFallsInsideTheTouchBeforeIt) {
     EXPECT_EQ(errorOf("reset 1s\n"), "line 1: a reset offset must fall inside the touch on a line before it");
 }
 
+TEST(GestureScriptTest, RefusesWhatTheFingerModelCannotMake) {
+    EXPECT_EQ(errorOf("tap volume-up 10ms"), "line 1: a touch lasts at least 16ms (two frames)");
+    EXPECT_EQ(errorOf("brush volume-up 15ms"), "line 1: a touch lasts at least 16ms (two frames)");
+    EXPECT_EQ(errorOf("brush volume-up 401ms"), "line 1: a brush lasts at most 400ms: a finger that stays longer touches");
+    EXPECT_EQ(errorOf("slide volume-up volume-down 2s\nreset 1s\n"),
+              "line 2: a reset can fall inside a tap or a hold, not inside a slide or a brush");
+    EXPECT_EQ(errorOf("brush volume-up 300ms\nreset 100ms\n"),
+              "line 2: a reset can fall inside a tap or a hold, not inside a slide or a brush");
+    EXPECT_NO_THROW(GestureScript::parse("tap volume-up 16ms\nbrush volume-down 400ms\nhold play-pause 1s\nreset 600ms\n"));
+}
+
 TEST(GestureScriptTest, NamesTheLineAndWhatIsWrong) {
     EXPECT_EQ(errorOf("wait 1s\njump volume-up 1s\n"),
               "line 2: unknown gesture 'jump' (tap, hold, slide, brush, wait, reset, set)");

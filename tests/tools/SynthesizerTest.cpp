@@ -259,3 +259,50 @@ TEST(SynthesizerTest, SettingWrittenInTheScriptChangesTheOutcome) {
 
 }  // namespace
 }  // namespace TolkaTouch::Tools
+
+namespace TolkaTouch::Tools {
+namespace {
+
+// The kinds of the events a replay of the synthesis gives, without writing a document.
+std::vector<std::string> replayedKinds(const Synthesis& synthesis) {
+    Replayer replayer(recordingFromSynthesis(synthesis));
+    std::vector<std::string> kinds;
+    ReplayOptions options;
+    options.fast = true;
+    replayer.run(options, [&](const HIDEvent& event) { kinds.emplace_back(GestureCodec::kindName(event)); });
+    return kinds;
+}
+
+TEST(SynthesizerTest, NoBrushFrom20To120MillisecondsIsATapInAnyZoneForSeeds1To50) {
+    for (const char* zone : {"play-pause", "volume-up", "volume-down"}) {
+        for (int duration = 20; duration <= 120; ++duration) {
+            const GestureScript script = GestureScript::parse("brush " + std::string(zone) + " " + std::to_string(duration) + "ms\n");
+            for (uint64_t seed = 1; seed <= 50; ++seed) {
+                const std::vector<std::string> kinds = replayedKinds(synthesize(script, seed));
+                ASSERT_EQ(std::count(kinds.begin(), kinds.end(), "tap"), 0) << zone << " " << duration << "ms seed " << seed;
+            }
+        }
+    }
+}
+
+TEST(SynthesizerTest, BrushLongEnoughToGrazeIsSeenAndTurnedDown) {
+    const std::vector<std::string> turnedDown{"may-begin", "cancel"};
+    for (const char* zone : {"play-pause", "volume-up", "volume-down"}) {
+        for (int duration : {64, 80, 100, 120, 200, 400}) {
+            const GestureScript script = GestureScript::parse("brush " + std::string(zone) + " " + std::to_string(duration) + "ms\n");
+            for (uint64_t seed = 1; seed <= 10; ++seed) {
+                EXPECT_EQ(replayedKinds(synthesize(script, seed)), turnedDown) << zone << " " << duration << "ms seed " << seed;
+            }
+        }
+    }
+}
+
+TEST(SynthesizerTest, BrushTooShortToGrazePassesUnseen) {
+    for (const char* zone : {"play-pause", "volume-up", "volume-down"}) {
+        const GestureScript script = GestureScript::parse("brush " + std::string(zone) + " 40ms\n");
+        for (uint64_t seed = 1; seed <= 10; ++seed) EXPECT_EQ(replayedKinds(synthesize(script, seed)), std::vector<std::string>{}) << zone;
+    }
+}
+
+}  // namespace
+}  // namespace TolkaTouch::Tools
