@@ -24,5 +24,6 @@ void addLogCommand(CLI::App& app);
 void addWatchCommand(CLI::App& app);
 void addEvalCommand(CLI::App& app);
 void addSweepCommand(CLI::App& app);
+void addPlotCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

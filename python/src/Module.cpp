@@ -1,0 +1,17 @@
+// The tolkatouch package's extension module: recordings, replay and synthesis in C++, handed to
+// Python as numpy arrays.
+
+#include <pybind11/pybind11.h>
+
+#include "Errors.h"
+#include "RecordingBinding.h"
+#include "ReplayBinding.h"
+#include "SynthBinding.h"
+
+PYBIND11_MODULE(_tolkatouch, module) {
+    module.doc() = "The C++ side of the tolkatouch package; use the names tolkatouch exports.";
+    TolkaTouch::Python::addErrors(module);
+    TolkaTouch::Python::addRecording(module);
+    TolkaTouch::Python::addReplay(module);
+    TolkaTouch::Python::addSynth(module);
+}

@@ -1,0 +1,90 @@
+// tolkatouch plot: draws a recording with the tolkatouch Python package (python3 -m
+// tolkatouch.plot). The package is looked for beside the program in the build tree
+// (<build>/tools/tolkatouch and <build>/python/tolkatouch), then in the system's Python path.
+
+#include <unistd.h>
+
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+#include <filesystem>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+
+#include <CLI/CLI.hpp>
+
+#include "tools/Commands.h"
+#include "tools/DocumentFile.h"
+
+namespace TolkaTouch::Tools {
+
+namespace {
+
+// The interpreter the package is built for: Debian's, which has numpy and matplotlib.
+constexpr const char* kPython = "/usr/bin/python3";
+
+struct PlotArguments {
+    std::string document;
+    std::string output;
+    std::optional<double> from;
+    std::optional<double> to;
+    std::vector<std::string> settings;
+};
+
+// <build>/python when this program runs from a build tree that built the package.
+std::optional<std::filesystem::path> buildTreePackageDirectory() {
+    std::error_code error;
+    const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
+    if (error) return std::nullopt;
+    const std::filesystem::path directory = self.parent_path().parent_path() / "python";
+    if (!std::filesystem::exists(directory / "tolkatouch" / "plot.py", error)) return std::nullopt;
+    return directory;
+}
+
+[[noreturn]] void runPlot(const PlotArguments& arguments) {
+    if (const auto directory = buildTreePackageDirectory()) {
+        std::string path = directory->string();
+        if (const char* existing = std::getenv("PYTHONPATH"); existing && *existing) path += std::string(":") + existing;
+        ::setenv("PYTHONPATH", path.c_str(), 1);
+    }
+    ::setenv("TOLKATOUCH_PLOT_PROG", "tolkatouch plot", 1);
+
+    std::vector<std::string> words{kPython, "-m", "tolkatouch.plot", arguments.document, "-o", arguments.output};
+    if (arguments.from) words.insert(words.end(), {"--from", std::to_string(*arguments.from)});
+    if (arguments.to) words.insert(words.end(), {"--to", std::to_string(*arguments.to)});
+    for (const std::string& setting : arguments.settings) words.insert(words.end(), {"--set", setting});
+    std::vector<char*> argv;
+    for (std::string& word : words) argv.push_back(word.data());
+    argv.push_back(nullptr);
+
+    std::fflush(stdout);
+    ::execv(kPython, argv.data());
+    throw ToolError(kPython, std::strerror(errno));
+}
+
+}  // namespace
+
+void addPlotCommand(CLI::App& app) {
+    auto arguments = std::make_shared<PlotArguments>();
+    CLI::App* command = app.add_subcommand(
+        "plot",
+        "Draw a recording as the recognizer saw it: pixel readings by zone with their on flags, the touch score, the "
+        "hand state and active region, and every event, on one time axis (needs the tolkatouch Python package).");
+    command->add_option("DOCUMENT", arguments->document, "Recording document to draw")->required();
+    command->add_option("-o,--output", arguments->output, "Image to write: .png, .svg or .pdf")
+        ->required()
+        ->type_name("IMAGE");
+    command->add_option("--from", arguments->from, "First second to draw, from the first frame")->type_name("S");
+    command->add_option("--to", arguments->to, "Last second to draw, from the first frame")->type_name("S");
+    command->add_option("--set", arguments->settings,
+                        "Apply a setting before the first frame, as replay --set does (repeatable)")
+        ->type_name("KEY=VALUE")
+        ->expected(1)
+        ->allow_extra_args(false)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
+    command->callback([arguments] { runPlot(*arguments); });
+}
+
+}  // namespace TolkaTouch::Tools
