@@ -4,6 +4,7 @@
 #include <pybind11/pybind11.h>
 
 #include "Errors.h"
+#include "EvaluateBinding.h"
 #include "RecordingBinding.h"
 #include "ReplayBinding.h"
 #include "SynthBinding.h"
@@ -14,4 +15,5 @@ PYBIND11_MODULE(_tolkatouch, module) {
     TolkaTouch::Python::addRecording(module);
     TolkaTouch::Python::addReplay(module);
     TolkaTouch::Python::addSynth(module);
+    TolkaTouch::Python::addEvaluate(module);
 }

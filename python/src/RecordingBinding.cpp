@@ -1,6 +1,7 @@
 #include "RecordingBinding.h"
 
 #include <cstring>
+#include <filesystem>
 
 #include <pybind11/stl.h>
 
@@ -123,6 +124,7 @@ Recording Recording::fromBytes(std::vector<uint8_t> document, const std::string&
 
 Recording Recording::load(const std::string& path) {
     std::vector<uint8_t> document;
+    std::optional<std::vector<Workbench::Label>> labels;
     {
         py::gil_scoped_release unlocked;
         try {
@@ -130,8 +132,35 @@ Recording Recording::load(const std::string& path) {
         } catch (const Tools::ToolError& error) {
             throw FileFailure(error.what());
         }
+        const std::string labelsPath = Workbench::labelsPathFor(path);
+        std::error_code missing;
+        if (path != "-" && std::filesystem::exists(labelsPath, missing)) {
+            try {
+                const std::vector<uint8_t> text = Tools::readFileBytes(labelsPath);
+                labels = Workbench::parseLabels(std::string_view(reinterpret_cast<const char*>(text.data()), text.size()));
+            } catch (const Tools::ToolError& error) {
+                throw FileFailure(error.what());
+            } catch (const Workbench::LabelsError& error) {
+                throw DocumentFailure(labelsPath + ": " + error.what());
+            }
+        }
     }
-    return fromBytes(std::move(document), path);
+    Recording recording = fromBytes(std::move(document), path);
+    recording.labels = std::move(labels);
+    return recording;
+}
+
+std::optional<std::string> Recording::labelsDocument() const {
+    if (!labels) return std::nullopt;
+    return Workbench::labelsDocument(*labels);
+}
+
+void Recording::setLabelsDocument(const std::string& text, const std::string& subject) {
+    try {
+        labels = Workbench::parseLabels(text);
+    } catch (const Workbench::LabelsError& error) {
+        throw DocumentFailure(subject + ": " + error.what());
+    }
 }
 
 std::vector<uint8_t> Recording::toBytes() const {
@@ -155,7 +184,36 @@ void Recording::save(const std::string& path) const {
 
 size_t Recording::imageCount() const { return static_cast<size_t>(py::len(frameNumbers)); }
 
+namespace {
+
+py::object zoneOrNone(PixelRegion zone) {
+    if (zone == PixelRegion::None) return py::none();
+    return py::str(std::string(Workbench::zoneName(zone)));
+}
+
+py::bytes bytesOf(const std::vector<uint8_t>& bytes) {
+    return py::bytes(reinterpret_cast<const char*>(bytes.data()), bytes.size());
+}
+
+}  // namespace
+
 void addRecording(py::module_& module) {
+    py::class_<Workbench::Label>(module, "Label",
+                                 "What a stretch of a recording was meant to be: a tap, hold, slide or brush in a zone, "
+                                 "or none (nothing meant to happen).")
+        .def_property_readonly("kind", [](const Workbench::Label& l) { return std::string(Workbench::intendedName(l.kind)); },
+                               "'tap', 'hold', 'slide', 'brush' or 'none'.")
+        .def_property_readonly("zone", [](const Workbench::Label& l) { return zoneOrNone(l.zone); },
+                               "'play-pause', 'volume-up' or 'volume-down'; None for kind 'none'.")
+        .def_property_readonly("to_zone", [](const Workbench::Label& l) { return zoneOrNone(l.toZone); },
+                               "A slide's last zone; None otherwise.")
+        .def_readonly("start_us", &Workbench::Label::startUs, "When the finger arrives, microseconds from the first frame.")
+        .def_readonly("end_us", &Workbench::Label::endUs, "When the finger leaves, microseconds from the first frame.")
+        .def("__repr__", [](const Workbench::Label& l) {
+            return "Label(" + std::string(Workbench::intendedName(l.kind)) + ", " + std::string(Workbench::zoneName(l.zone)) +
+                   ", " + std::to_string(l.startUs) + "-" + std::to_string(l.endUs) + " us)";
+        });
+
     py::class_<FirmwareEventRecord>(module, "FirmwareEvent",
                                     "One firmware event report of a recording (event 0 is the firmware's reset).")
         .def_readonly("host_time", &FirmwareEventRecord::hostTime, "Host clock nanoseconds of the report.")
@@ -203,20 +261,40 @@ void addRecording(py::module_& module) {
                       "int16 array (N, 15): the signed readings the recognizer consumes, columns A..O.")
         .def_readonly("firmware_events", &Recording::firmwareEvents, "list of FirmwareEvent, oldest first.")
         .def_readonly("setting_changes", &Recording::settingChanges, "list of SettingChange, oldest first.")
+        .def_readonly("labels", &Recording::labels,
+                      "list of Label, or None: what the recording was meant to contain (from synth(), or the "
+                      "DOC.labels.json beside a loaded DOC.json).")
+        .def("labels_document", &Recording::labelsDocument,
+             "The labels as a labels document (what `tolkatouch eval` reads beside a recording), or None.")
+        .def(
+            "save_labels",
+            [](const Recording& r, const std::string& path) {
+                const std::optional<std::string> text = r.labelsDocument();
+                if (!text) throw py::value_error("the recording has no labels");
+                try {
+                    Tools::writeFileBytes(path, std::vector<uint8_t>(text->begin(), text->end()));
+                } catch (const Tools::ToolError& error) {
+                    throw FileFailure(error.what());
+                }
+            },
+            py::arg("path"), "Writes the labels document (DOC.labels.json beside DOC.json for eval); raises OSError.")
         .def("__len__", &Recording::imageCount, "The number of image frames.")
         .def("__repr__", [](const Recording& r) {
             return "<tolkatouch.Recording: " + std::to_string(r.imageCount()) + " images, " +
                    std::to_string(r.firmwareEvents.size()) + " firmware events, " +
                    std::to_string(r.settingChanges.size()) + " setting changes>";
         })
+        // Pickled as the document and its labels, so that recordings travel to other processes.
         .def(py::pickle(
             [](const Recording& r) {
-                const std::vector<uint8_t> document = r.toBytes();
-                return py::bytes(reinterpret_cast<const char*>(document.data()), document.size());
+                const std::optional<std::string> labels = r.labelsDocument();
+                return py::make_tuple(bytesOf(r.toBytes()), labels ? py::object(py::str(*labels)) : py::object(py::none()));
             },
-            [](py::bytes document) {
-                const std::string_view view = document;
-                return Recording::fromBytes(std::vector<uint8_t>(view.begin(), view.end()), "<pickle>");
+            [](const py::tuple& state) {
+                const std::string_view view = state[0].cast<py::bytes>();
+                Recording recording = Recording::fromBytes(std::vector<uint8_t>(view.begin(), view.end()), "<pickle>");
+                if (!state[1].is_none()) recording.setLabelsDocument(state[1].cast<std::string>(), "<pickle>");
+                return recording;
             }));
 }
 

@@ -4,12 +4,14 @@
 // objects. Replay and synthesis take and give this type.
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
 #include <pybind11/pybind11.h>
 
 #include "pipeline/PipelineRecording.h"
+#include "tools/workbench/Labels.h"
 
 namespace TolkaTouch::Python {
 
@@ -34,10 +36,15 @@ public:
     // Reads the document (any accepted version) with the interpreter lock released; throws
     // DocumentFailure with "<subject>: <reader's message>".
     static Recording fromBytes(std::vector<uint8_t> document, const std::string& subject);
+    // Also reads the labels beside the document (DOC.labels.json) when there are any; throws
+    // DocumentFailure naming the labels file when they do not read.
     static Recording load(const std::string& path);
     explicit Recording(PipelineRecording recording);
 
-    std::vector<uint8_t> toBytes() const;  // the document as `tolkatouch synth` and `convert` write it
+    std::vector<uint8_t> toBytes() const;
+    std::optional<std::string> labelsDocument() const;
+    // Throws DocumentFailure "<subject>: <what is wrong>".
+    void setLabelsDocument(const std::string& text, const std::string& subject);  // the document as `tolkatouch synth` and `convert` write it
     void save(const std::string& path) const;
 
     const PipelineRecording& recording() const { return *_recording; }
@@ -50,6 +57,8 @@ public:
     py::object readings;       // N x 15 int16: what the recognizer consumes, A..O
     std::vector<FirmwareEventRecord> firmwareEvents;
     std::vector<SettingChangeRecord> settingChanges;
+    // What the recording was meant to contain (synthesis, or DOC.labels.json beside DOC.json).
+    std::optional<std::vector<Workbench::Label>> labels;
 
 private:
     // Shared, never changed after construction: replays read it with the lock released.
