@@ -124,10 +124,29 @@ gives the target TolkaTouch::tolkatouch), and an example project.")
 
 set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-tolkatouch)
 set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
-set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS "python3, python3-numpy")
 set(CPACK_DEBIAN_PYTHON_DESCRIPTION "TolkaTouch recordings in Python
-The tolkatouch Python module reads TolkaTouch recording documents and the
-recognizer's per-frame numbers as numpy arrays.")
+The tolkatouch Python module reads TolkaTouch recording documents as numpy
+arrays, replays them with the recognizer's per-frame numbers as columns,
+synthesises recordings and plots them (python3 -m tolkatouch.plot).")
+if(TARGET _tolkatouch AND DEFINED TOLKA_PYTHON_INSTALL_DIR)
+  # The extension links the service's private libtolkatouch-platform: it finds it in the
+  # tolkatouch package's folder, relative to itself, and so depends on that very version.
+  file(RELATIVE_PATH tolka_platform_from_python ${CMAKE_INSTALL_PREFIX}/${TOLKA_PYTHON_INSTALL_DIR}/tolkatouch
+       ${CMAKE_INSTALL_FULL_LIBDIR}/tolkatouch)
+  set_target_properties(_tolkatouch PROPERTIES INSTALL_RPATH "$ORIGIN/${tolka_platform_from_python}")
+  # dpkg-shlibdeps cannot see a library private to another package, so the dependencies are
+  # written out: the C and C++ runtimes as tolkatouch's own (which it depends on exactly), the
+  # interpreter the extension was built for, and the modules the package imports.
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SHLIBDEPS OFF)
+  execute_process(COMMAND ${Python3_EXECUTABLE} -c "import sys; print(sys.version_info[0], sys.version_info[1])"
+                  OUTPUT_VARIABLE tolka_python OUTPUT_STRIP_TRAILING_WHITESPACE COMMAND_ERROR_IS_FATAL ANY)
+  separate_arguments(tolka_python)
+  list(GET tolka_python 0 tolka_python_major)
+  list(GET tolka_python 1 tolka_python_minor)
+  math(EXPR tolka_python_next "${tolka_python_minor} + 1")
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
+      "tolkatouch (= ${TOLKA_PACKAGE_VERSION}), python3 (>= ${tolka_python_major}.${tolka_python_minor}~), python3 (<< ${tolka_python_major}.${tolka_python_next}), python3-numpy, python3-matplotlib, libc6 (>= 2.34), libgcc-s1 (>= 3.0), libstdc++6 (>= 12)")
+endif()
 
 include(CPack)
 foreach(group IN LISTS TOLKA_PACKAGE_GROUPS)

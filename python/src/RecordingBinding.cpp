@@ -116,7 +116,9 @@ Recording Recording::fromBytes(std::vector<uint8_t> document, const std::string&
         try {
             recording.emplace(Tools::recordingFromDocument(document, subject));
         } catch (const Tools::ToolError& error) {
-            throw DocumentFailure(error.what());
+            // Both of the command line's lines: what failed, then the parser's reason and position.
+            throw DocumentFailure(error.detail().empty() ? std::string(error.what())
+                                                         : std::string(error.what()) + "\n  " + error.detail());
         }
     }
     return Recording(std::move(*recording));

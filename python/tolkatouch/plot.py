@@ -31,6 +31,12 @@ def printable(text: str) -> str:
     return "".join(f"\\x{ord(c):02x}" if ord(c) < 0x20 or ord(c) == 0x7F else c for c in text)
 
 
+def error_lines(error: BaseException) -> str:
+    """An error as the command line prints it: each line printable, a document's reason and
+    position on a second line."""
+    return "\n".join(printable(line) for line in str(error).split("\n"))
+
+
 def output_format(path: str) -> str:
     """The image format named by the output's extension; ValueError for any other."""
     extension = os.path.splitext(path)[1].lower().lstrip(".")
@@ -75,10 +81,10 @@ def main(argv: Optional[Sequence[str]] = None, prog: Optional[str] = None) -> in
     try:
         plot_recording(arguments.recording, arguments.output, arguments.start, arguments.end, arguments.settings)
     except Error as error:
-        print(f"tolkatouch: {printable(str(error))}", file=sys.stderr)
+        print(f"tolkatouch: {error_lines(error)}", file=sys.stderr)
         return EXIT_USAGE if error.__class__.__name__ == "SettingError" else EXIT_FAILURE
     except OSError as error:
-        print(f"tolkatouch: {printable(str(error))}", file=sys.stderr)
+        print(f"tolkatouch: {error_lines(error)}", file=sys.stderr)
         return EXIT_FAILURE
     return 0
 

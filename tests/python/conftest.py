@@ -36,7 +36,8 @@ def json_events(tool: str, document: pathlib.Path, *settings: str) -> list:
 
 
 def cli_error(tool: str, *arguments: str) -> str:
-    """The command line's error line without its "tolkatouch: " prefix."""
+    """The command line's error without its "tolkatouch: " prefix: one line, or two where a document's
+    reader adds its reason and position."""
     result = run_tool(tool, *arguments)
     assert result.returncode != 0
     line = result.stderr.strip()

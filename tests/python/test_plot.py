@@ -57,7 +57,8 @@ def test_a_bad_document_fails_with_the_readers_line(tool, tmp_path):
     path = str(DATA / "version-2.json")
     result = run_tool(tool, "plot", path, "-o", str(tmp_path / "x.png"))
     assert (result.returncode, result.stderr) == (
-        1, f"tolkatouch: {path}: migrateSerializedContainer failed: invalid container version: 2\n")
+        1, f"tolkatouch: {path}: migrateSerializedContainer failed: invalid container version: 2\n"
+        "  the versions this program reads are 0 and 1\n")
 
 
 def test_a_refused_setting_is_a_usage_error(tool, tmp_path):

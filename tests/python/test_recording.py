@@ -92,7 +92,7 @@ def test_a_missing_file_raises_os_error_with_the_command_lines_message(tool):
 
 
 def test_from_bytes_names_the_document_in_its_error():
-    with pytest.raises(tolkatouch.DocumentError, match="^notes: migrateSerializedContainer failed: invalid container$"):
+    with pytest.raises(tolkatouch.DocumentError, match="^notes: migrateSerializedContainer failed: invalid container\n  byte 1 \\(line 1, column 2\\): "):
         tolkatouch.Recording.from_bytes(b"not json", name="notes")
 
 
