@@ -65,7 +65,7 @@ contents)
     libdir=usr/lib/$multiarch
     contents() { dpkg-deb -c "$(deb_of "$1")" | awk '{print $6}' | sed 's|^\./||'; }
     has() {  # has PACKAGE PATH
-        contents "$1" | grep -qx "$2" || fail "$1 lacks /$2"
+        contents "$1" | grep -x "$2" >/dev/null || fail "$1 lacks /$2"
     }
     for path in usr/bin/tolkatouch usr/sbin/tolkatouchd "$libdir/tolkatouch/tolkatouch-hidservice.so" \
                 "$libdir/tolkatouch/libtolkatouch-platform.so.0" usr/lib/systemd/system/tolkatouchd.service \
@@ -96,13 +96,13 @@ contents)
     dpkg-deb -x "$(deb_of tolkatouch)" "$folder"
     grep -qx "ExecStart=/usr/sbin/tolkatouchd" "$folder/usr/lib/systemd/system/tolkatouchd.service" ||
         fail "the unit does not start /usr/sbin/tolkatouchd"
-    dpkg-deb --ctrl-tarfile "$(deb_of tolkatouch)" | tar -xO ./conffiles | grep -qx /etc/tolkatouch/log.conf ||
+    dpkg-deb --ctrl-tarfile "$(deb_of tolkatouch)" | tar -xO ./conffiles | grep -x /etc/tolkatouch/log.conf >/dev/null ||
         fail "/etc/tolkatouch/log.conf is not a conffile"
     depends=$(dpkg-deb -f "$(deb_of tolkatouch)" Depends)
     for library in libudev1 libevdev2 libsystemd0; do
         [[ $depends == *"$library"* ]] || fail "tolkatouch does not depend on $library (dpkg-shlibdeps): $depends"
     done
-    dpkg-deb --ctrl-tarfile "$(deb_of libtolkatouch-dev)" | tar -xO ./shlibs | grep -q "^libtolkatouch 0 " ||
+    dpkg-deb --ctrl-tarfile "$(deb_of libtolkatouch-dev)" | tar -xO ./shlibs | grep "^libtolkatouch 0 " >/dev/null ||
         fail "libtolkatouch-dev has no shlibs entry for libtolkatouch.so.0"
     echo "contents: every file where the unit, the udev rule and the daemon expect it"
     ;;
@@ -123,7 +123,7 @@ extracted)
     modversion=$(PKG_CONFIG_PATH=$folder/usr/lib/$multiarch/pkgconfig pkg-config --modversion tolkatouch)
     [ "$modversion" = "$version" ] || fail "pkg-config --modversion tolkatouch says $modversion, the packages $version"
     # The tool replays a shipped example with the libraries of the unpacked tree.
-    ldd "$tool" | grep -q "libtolkatouch-platform.so.0 => $folder/" || fail "tolkatouch does not load its own library"
+    ldd "$tool" | grep "libtolkatouch-platform.so.0 => $folder/" >/dev/null || fail "tolkatouch does not load its own library"
     "$tool" replay --fast --json "$folder/usr/share/doc/tolkatouch/examples/everyday-session.json" >"$folder/replay.jsonl"
     expect_same "tolkatouch replay of the shipped example" "$source/tests/tools/expected/everyday-session.jsonl" "$folder/replay.jsonl"
     # The daemon finds the plug-in beside itself in the unpacked tree, not in /usr.
@@ -167,7 +167,7 @@ install)
     [ "$(id -u)" -eq 0 ] || { echo "skipped: installing packages needs root (CI runs as root)"; exit 77; }
     need apt-get apt
     for package in "${packages[@]}"; do
-        if dpkg-query -W -f='${Status}' "$package" 2>/dev/null | grep -q "installed"; then
+        if dpkg-query -W -f='${Status}' "$package" 2>/dev/null | grep "installed" >/dev/null; then
             echo "skipped: $package is installed on this machine already; it is left alone"
             exit 77
         fi
@@ -185,7 +185,7 @@ install)
     make_scratch
     restore() {
         for package in "${packages[@]}"; do
-            dpkg-query -W -f='${Status}' "$package" 2>/dev/null | grep -q "installed" && apt-get purge -y -q "$package" >/dev/null 2>&1
+            dpkg-query -W -f='${Status}' "$package" 2>/dev/null | grep "installed" >/dev/null && apt-get purge -y -q "$package" >/dev/null 2>&1
         done
         if [ "$user_existed" = no ]; then
             getent passwd tolkatouch >/dev/null && userdel tolkatouch
