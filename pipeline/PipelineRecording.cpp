@@ -52,12 +52,13 @@ PipelineRecording& PipelineRecording::operator=(PipelineRecording&& other) noexc
     _play = other._play;
     if (atEnd || !_play.valid) _play.iterator = _frames.end();
     other._frames.clear();
-    other._play = PlayCursor{false, other._frames.end(), 0, std::nullopt};
+    other._play = PlayCursor{false, other._frames.end(), 0, std::nullopt, std::nullopt};
     return *this;
 }
 
 void PipelineRecording::adoptCursor(const PlayCursor& cursor, const std::list<Frame>& from) {
-    _play = PlayCursor{cursor.valid, _frames.end(), cursor.startTimeMach, cursor.lastInputReportTimeNs};
+    _play = PlayCursor{cursor.valid, _frames.end(), cursor.startTimeMach, cursor.lastInputReportTimeNs,
+                       cursor.firstTimestampNs};
     // An inactive cursor may point at a frame that trimming has since removed; only an active
     // one is guaranteed to point into the list.
     if (!cursor.valid) return;

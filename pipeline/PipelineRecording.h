@@ -22,6 +22,7 @@
 //   static PropertyValue migrateSerializedContainer(const std::optional<PropertyValue>& container);
 //   static std::list<Frame> framesFromContainer(const PropertyValue& container); // a version-1 container's frames
 //   void playReset();  bool playCanContinue() const;  void playNextFrame(float speed); // throws std::runtime_error
+//   void playFrame(const Frame& frame, float speed);            // after playReset: one frame from elsewhere
 //
 // Document (version 1), timestamps in host clock nanoseconds:
 //   { "Version": 1, "Frames": [ { "Type": "State", "Timestamp": 1000, "Key": "Algs.HoldTimeoutMilliseconds",
@@ -100,6 +101,10 @@ public:
     void playReset();
     bool playCanContinue() const;
     void playNextFrame(float speed);
+    // Plays a frame that is not in the list (one a reader hands out), paced and timed as if it
+    // were the list's next: the first frame played after playReset sets the replay clock's origin.
+    // A recording that streams its frames this way keeps none of them.
+    void playFrame(const Frame& frame, float speed);
 
     std::shared_ptr<PipelineInput> pipeline;
     HostClock clock;
@@ -110,6 +115,7 @@ private:
         std::list<Frame>::iterator iterator;  // next frame to deliver
         uint64_t startTimeMach = 0;           // host clock ticks at playReset: the replay clock's origin
         std::optional<uint64_t> lastInputReportTimeNs;
+        std::optional<uint64_t> firstTimestampNs;  // the first played frame's: the recorded clock's origin
     };
 
     void recordState(uint64_t timestamp, const std::string& key, const PropertyValue& value) noexcept;
@@ -117,10 +123,11 @@ private:
     static void trimFrames(std::list<Frame>& frames, uint64_t maxInputReports, std::list<Frame>::iterator* cursor);
     void trim(uint64_t maxInputReports);
     void adoptCursor(const PlayCursor& cursor, const std::list<Frame>& from);
+    void deliver(const Frame& frame, float speed);
 
     std::list<Frame> _frames;
     uint64_t _maxFrameCount = 0;  // input reports to keep; 0 = no bound
-    PlayCursor _play{false, _frames.end(), 0, std::nullopt};
+    PlayCursor _play{false, _frames.end(), 0, std::nullopt, std::nullopt};
 };
 
 }  // namespace TolkaTouch

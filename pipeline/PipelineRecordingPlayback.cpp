@@ -26,6 +26,8 @@ void PipelineRecording::playReset() {
     _play.iterator = _frames.begin();
     _play.startTimeMach = clock.now();
     _play.lastInputReportTimeNs.reset();
+    _play.firstTimestampNs.reset();
+    if (!_frames.empty()) _play.firstTimestampNs = _frames.front().timestamp;
 }
 
 bool PipelineRecording::playCanContinue() const { return _play.valid && _play.iterator != _frames.end(); }
@@ -37,7 +39,16 @@ void PipelineRecording::playNextFrame(float speed) {
     // Advance before delivering: a frame that makes the pipeline fail is not delivered twice.
     const Frame& frame = *_play.iterator;
     ++_play.iterator;
+    deliver(frame, speed);
+}
 
+void PipelineRecording::playFrame(const Frame& frame, float speed) {
+    if (!(speed > 0.0f)) speed = 1.0f;
+    if (!_play.firstTimestampNs) _play.firstTimestampNs = frame.timestamp;
+    deliver(frame, speed);
+}
+
+void PipelineRecording::deliver(const Frame& frame, float speed) {
     if (frame.type == FrameType::InputReport) {
         if (_play.lastInputReportTimeNs && frame.timestamp > *_play.lastInputReportTimeNs) {
             clock.sleepMicroseconds(pacingMicroseconds(frame.timestamp - *_play.lastInputReportTimeNs, speed));
@@ -48,7 +59,7 @@ void PipelineRecording::playNextFrame(float speed) {
     if (!pipeline) return;
     // The clock follows the recorded spacing whatever the speed, so the recognizer sees the
     // times it saw when the frames were recorded.
-    pipeline->setTime(_play.startTimeMach + Util::machTimeFromNanoseconds(frame.timestamp - _frames.front().timestamp));
+    pipeline->setTime(_play.startTimeMach + Util::machTimeFromNanoseconds(frame.timestamp - *_play.firstTimestampNs));
     switch (frame.type) {
     case FrameType::InputReport:
         pipeline->handleInputReport(frame.report.data(), frame.report.size());

@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <memory>
 #include <string>
+#include <string_view>
+#include <utility>
 #include <vector>
 
 #include <CLI/CLI.hpp>
@@ -34,17 +36,51 @@ struct ReplayArguments {
     bool stats = false;
 };
 
-PipelineRecording recordingToReplay(const std::string& document) {
-    if (!document.empty()) return loadRecording(document);
-    const std::string_view sample = sampleRecordingDocument();
-    return recordingFromDocument(std::vector<uint8_t>(sample.begin(), sample.end()), kSampleRecordingName);
+// Seconds from the first frame of the document at `path` to its last, read in a pass of its own.
+double documentSeconds(const std::string& path) {
+    RecordingFile file(path);
+    PipelineRecording::Frame frame;
+    if (!file.next(frame)) return 0.0;
+    const uint64_t first = frame.timestamp;
+    uint64_t last = first;
+    while (file.next(frame)) last = frame.timestamp;
+    return static_cast<double>(static_cast<int64_t>(last - first)) / 1e9;
+}
+
+// The replayer, and the recording's length in seconds when the progress line wants it. A file is
+// played as it is read, a frame at a time, so a recording of any length replays in the memory of
+// one frame; the progress line reads the file once more for its length beforehand. Standard input
+// cannot be read twice, so a paced replay of it on a terminal holds it whole, as does the small
+// built-in sample.
+struct ReplaySource {
+    Replayer replayer;
+    double seconds = 0.0;
+};
+
+ReplaySource replaySource(const std::string& document, bool wantSeconds) {
+    if (document.empty()) {
+        const std::string_view sample = sampleRecordingDocument();
+        PipelineRecording recording =
+            recordingFromDocument(std::vector<uint8_t>(sample.begin(), sample.end()), kSampleRecordingName);
+        const double seconds = recordingSeconds(recording);
+        return {Replayer(std::move(recording)), seconds};
+    }
+    if (wantSeconds && document == "-") {
+        PipelineRecording recording = loadRecording(document);
+        const double seconds = recordingSeconds(recording);
+        return {Replayer(std::move(recording)), seconds};
+    }
+    const double seconds = wantSeconds ? documentSeconds(document) : 0.0;
+    auto file = std::make_shared<RecordingFile>(document);
+    return {Replayer([file](PipelineRecording::Frame& frame) { return file->next(frame); }), seconds};
 }
 
 void runReplay(const ReplayArguments& arguments) {
-    PipelineRecording recording = recordingToReplay(arguments.document);
     // Position and time left on a terminal, for a paced replay only.
-    ReplayProgress progress(recordingSeconds(recording), arguments.speed, !arguments.fast && ::isatty(STDERR_FILENO));
-    Replayer replayer(std::move(recording));
+    const bool showProgress = !arguments.fast && ::isatty(STDERR_FILENO);
+    ReplaySource source = replaySource(arguments.document, showProgress);
+    Replayer& replayer = source.replayer;
+    ReplayProgress progress(source.seconds, arguments.speed, showProgress);
 
     ReplayOptions options;
     options.speed = arguments.speed;

@@ -11,6 +11,12 @@ Replayer::Replayer(PipelineRecording recording)
     if (!_recording.frames().empty()) _origin = Util::machTimeFromNanoseconds(_recording.frames().front().timestamp);
 }
 
+Replayer::Replayer(FrameSource source) : _source(std::move(source)), _pipeline(std::make_shared<Pipeline>()) {
+    _recording.pipeline = _pipeline;
+    _hasFirstFrame = _source(_firstFrame);
+    if (_hasFirstFrame) _origin = Util::machTimeFromNanoseconds(_firstFrame.timestamp);
+}
+
 void Replayer::run(const ReplayOptions& options, const std::function<void(const HIDEvent&)>& onEvent) {
     const uint64_t origin = _origin;
     _recording.clock.now = [origin] { return origin; };
@@ -34,7 +40,15 @@ void Replayer::run(const ReplayOptions& options, const std::function<void(const 
     for (const auto& [key, value] : options.settings) _pipeline->setState(key, value);
 
     _recording.playReset();
-    while (_recording.playCanContinue()) _recording.playNextFrame(options.speed);
+    if (_source) {
+        if (_hasFirstFrame) {
+            _recording.playFrame(_firstFrame, options.speed);
+            PipelineRecording::Frame frame;
+            while (_source(frame)) _recording.playFrame(frame, options.speed);
+        }
+    } else {
+        while (_recording.playCanContinue()) _recording.playNextFrame(options.speed);
+    }
     _pipeline->hidEventsProbe = nullptr;
 }
 

@@ -37,7 +37,13 @@ struct ReplayOptions {
 
 class Replayer {
 public:
+    // Hands out the next frame; false at the end.
+    using FrameSource = std::function<bool(PipelineRecording::Frame& frame)>;
+
     explicit Replayer(PipelineRecording recording);
+    // Plays frames as the source hands them out, holding none of them: a recording of any length
+    // replays in the memory of one frame. Reads the first frame at once, for the replay clock.
+    explicit Replayer(FrameSource source);
 
     // Plays every frame once; onEvent sees each event after the pipeline stamped it.
     void run(const ReplayOptions& options, const std::function<void(const HIDEvent&)>& onEvent);
@@ -51,6 +57,9 @@ public:
 
 private:
     PipelineRecording _recording;
+    FrameSource _source;
+    PipelineRecording::Frame _firstFrame;
+    bool _hasFirstFrame = false;
     std::shared_ptr<Pipeline> _pipeline;
     uint64_t _origin = 0;
 };

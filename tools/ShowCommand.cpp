@@ -138,20 +138,21 @@ std::string describeFrame(const PipelineRecording::Frame& frame, bool raw) {
 }
 
 void runShow(const ShowArguments& arguments) {
-    const PipelineRecording recording = loadRecording(arguments.document);
-    const auto& frames = recording.frames();
-    if (frames.empty()) return;
-    const uint64_t first = frames.front().timestamp;
+    // Frames are shown as they are read: a recording of any length shows in the memory of one.
+    RecordingFile file(arguments.document);
+    PipelineRecording::Frame frame;
+    std::optional<uint64_t> first;
     bool shown = false;
     ShowSummary summary;
-    for (const PipelineRecording::Frame& frame : frames) {
+    while (file.next(frame)) {
+        if (!first) first = frame.timestamp;
         if (arguments.frame) {
             if (frame.type != PipelineRecording::FrameType::InputReport) continue;
             const auto image = InputReport::Image::parse(frame.report.data(), frame.report.size());
             if (!image || image->frameNumber != *arguments.frame) continue;
         }
         // Signed: a frame stamped before the first one shows as negative.
-        const double seconds = static_cast<double>(static_cast<int64_t>(frame.timestamp - first)) / 1e9;
+        const double seconds = static_cast<double>(static_cast<int64_t>(frame.timestamp - *first)) / 1e9;
         if (arguments.fromMs && seconds * 1000.0 < *arguments.fromMs) continue;
         if (arguments.toMs && seconds * 1000.0 > *arguments.toMs) continue;
         shown = true;
@@ -163,6 +164,7 @@ void runShow(const ShowArguments& arguments) {
                                                 : fmt::format("@ {:.3f}s  ", seconds) + describeFrame(frame, arguments.raw);
         std::fputs(text.c_str(), stdout);
     }
+    if (!first) return;  // an empty recording shows nothing
     if (arguments.summary) {
         const std::string text = arguments.json ? summary.json().dump() + "\n" : summary.text();
         std::fputs(text.c_str(), stdout);

@@ -190,6 +190,40 @@ TEST_F(PipelineRecordingPlaybackTest, FrameOlderThanTheFirstGivesAWrappedReplayC
     EXPECT_EQ(fake->calls[2], "setTime " + std::to_string(5000 + Util::machTimeFromNanoseconds(uint64_t{0} - 1000)));
 }
 
+TEST_F(PipelineRecordingPlaybackTest, FramesPlayedFromElsewhereGiveTheCallsAndSleepsOfTheSameFramesInTheList) {
+    const std::vector<Frame> frames{Frame::inputReport(1000000, {1}),
+                                    Frame::state(5000000, "Algs.HoldTimeoutMilliseconds", PropertyValue(400)),
+                                    Frame::inputReport(9000000, {2}), Frame::inputReport(4000000, {3})};
+    for (const Frame& frame : frames) recording.appendFrame(frame);
+    playAll(1.0f);
+    const std::vector<std::string> listCalls = fake->calls;
+    const std::vector<uint64_t> listSleeps = clock.sleeps;
+
+    PipelineRecording streamed;
+    streamed.pipeline = fake;
+    streamed.clock = clock.hostClock();
+    fake->calls.clear();
+    clock.sleeps.clear();
+    streamed.playReset();
+    for (const Frame& frame : frames) streamed.playFrame(frame, 1.0f);
+    EXPECT_EQ(fake->calls, listCalls);
+    EXPECT_EQ(clock.sleeps, listSleeps);
+    EXPECT_EQ(listSleeps, (std::vector<uint64_t>{8000}));
+    EXPECT_TRUE(streamed.frames().empty());
+}
+
+TEST_F(PipelineRecordingPlaybackTest, TheFirstFramePlayedFromElsewhereAfterAResetIsTheReplayClocksOrigin) {
+    recording.playReset();
+    recording.playFrame(Frame::inputReport(3000000, {1}), 2.0f);
+    recording.playFrame(Frame::inputReport(11000000, {2}), 2.0f);
+    clock.ticks = 9000;
+    recording.playReset();
+    recording.playFrame(Frame::inputReport(50000000, {3}), 2.0f);
+    EXPECT_EQ(fake->calls, (std::vector<std::string>{"setTime 5000", "handleInputReport 01 ", "setTime 197000",
+                                                     "handleInputReport 02 ", "setTime 9000", "handleInputReport 03 "}));
+    EXPECT_EQ(clock.sleeps, (std::vector<uint64_t>{4000}));
+}
+
 TEST_F(PipelineRecordingPlaybackTest, ReportsWithEqualOrDecreasingTimestampsAreDeliveredWithoutDelay) {
     addReport(8000000, 1);
     addReport(8000000, 2);

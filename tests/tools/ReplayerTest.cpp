@@ -2,6 +2,11 @@
 
 #include <gtest/gtest.h>
 
+#include <list>
+#include <memory>
+#include <string>
+#include <vector>
+
 #include "tolkatouch/Gesture.h"
 #include "tools/EventPrinter.h"
 #include "tools/GestureScript.h"
@@ -34,6 +39,47 @@ TEST(ReplayerTest, EventsCarryTheRecordedHostClockTimes) {
     ASSERT_EQ(lines.size(), 2u);
     EXPECT_NE(lines[0].find("may-begin   region 2  volume down"), std::string::npos) << lines[0];
     EXPECT_NE(lines[1].find("tap         region 2  volume down"), std::string::npos) << lines[1];
+}
+
+// A source handing out the recording's frames one at a time, counting how many it gave.
+Replayer::FrameSource sourceOf(const PipelineRecording& recording, int& handedOut) {
+    auto next = std::make_shared<std::list<PipelineRecording::Frame>::const_iterator>(recording.frames().begin());
+    return [&recording, &handedOut, next](PipelineRecording::Frame& frame) {
+        if (*next == recording.frames().end()) return false;
+        frame = **next;
+        ++*next;
+        ++handedOut;
+        return true;
+    };
+}
+
+TEST(ReplayerTest, AFrameSourcePlaysTheEventsAndTimesOfTheWholeRecording) {
+    const PipelineRecording recording = tapRecording();
+    std::vector<std::string> whole;
+    Replayer held{PipelineRecording(recording)};
+    held.run(pacedAt(1.0f, true), [&](const HIDEvent& event) {
+        whole.push_back(GestureCodec::jsonLine(event) + " " + std::to_string(held.secondsSinceStart(event)));
+    });
+
+    int handedOut = 0;
+    Replayer streamed(sourceOf(recording, handedOut));
+    EXPECT_EQ(handedOut, 1);  // the first frame, for the replay clock
+    EXPECT_EQ(streamed.origin(), held.origin());
+    std::vector<std::string> lines;
+    streamed.run(pacedAt(1.0f, true), [&](const HIDEvent& event) {
+        lines.push_back(GestureCodec::jsonLine(event) + " " + std::to_string(streamed.secondsSinceStart(event)));
+    });
+    EXPECT_EQ(handedOut, static_cast<int>(recording.frames().size()));
+    ASSERT_EQ(whole.size(), 2u);
+    EXPECT_EQ(lines, whole);
+}
+
+TEST(ReplayerTest, AnEmptyFrameSourcePlaysNothing) {
+    Replayer replayer(Replayer::FrameSource([](PipelineRecording::Frame&) { return false; }));
+    int events = 0;
+    replayer.run(ReplayOptions{}, [&](const HIDEvent&) { ++events; });
+    EXPECT_EQ(events, 0);
+    EXPECT_EQ(replayer.origin(), 0u);
 }
 
 TEST(ReplayerTest, SettingsApplyBeforeTheFirstFrame) {
