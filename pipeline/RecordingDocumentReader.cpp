@@ -59,9 +59,11 @@ Stop readFast(const uint8_t* data, size_t size, std::list<Frame>& frames) {
                 }
                 simdjson::ondemand::object object;
                 if (element.get_object().get(object)) return stop;
-                Frame frame;
-                if (RecordingFrameJson::readFrame(object, frame) != RecordingFrameJson::Read::Frame) return stop;
-                frames.push_back(std::move(frame));
+                // Read straight into the list's new node, without a move.
+                if (RecordingFrameJson::readFrame(object, frames.emplace_back()) != RecordingFrameJson::Read::Frame) {
+                    frames.pop_back();
+                    return stop;
+                }
                 ++index;
             }
             stop.frameIndex = -1;

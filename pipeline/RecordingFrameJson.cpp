@@ -32,6 +32,20 @@ constexpr std::array<int8_t, 256> kHexDigits = [] {
     return digits;
 }();
 
+// Two hex digits (the first in the low byte) to their byte, -1 for any other pair: one look-up
+// a byte. Only the 22 x 22 digit pairs are ever read, a few kilobytes of the table.
+constexpr std::array<int16_t, 65536> kHexPairs = [] {
+    std::array<int16_t, 65536> pairs{};
+    for (auto& pair : pairs) pair = -1;
+    for (int high = 0; high < 256; ++high) {
+        if (kHexDigits[high] < 0) continue;
+        for (int low = 0; low < 256; ++low) {
+            if (kHexDigits[low] >= 0) pairs[high | low << 8] = static_cast<int16_t>(kHexDigits[high] << 4 | kHexDigits[low]);
+        }
+    }
+    return pairs;
+}();
+
 // The text between the quotes of a string token without escapes; nothing when it has any.
 std::optional<std::string_view> plainString(value& member) {
     std::string_view token = member.raw_json_token();
@@ -95,19 +109,41 @@ bool unsignedMember(value& member, uint64_t& number) { return !member.get_uint64
 
 }  // namespace
 
-std::vector<uint8_t> reportBytesFromHexText(std::string_view text) {
-    std::vector<uint8_t> bytes((text.size() + 1) / 3);
+namespace {
+
+// The writer's form, "hh " per byte (the last separator optional), into `bytes`, whose storage is
+// reused; false for anything else. Every triple is checked and decoded without a branch.
+bool decodeWriterHex(std::string_view text, std::vector<uint8_t>& bytes) {
     const auto* at = reinterpret_cast<const uint8_t*>(text.data());
-    const size_t size = text.size();
-    size_t count = 0;
-    for (size_t i = 0; i < size; i += 3) {
-        const int high = kHexDigits[at[i]];
-        const int low = i + 1 < size ? kHexDigits[at[i + 1]] : -1;
-        const bool separated = i + 2 >= size || at[i + 2] == ' ';
-        if ((high | low) < 0 || !separated) return Util::bytesFromHexString(std::string(text));
-        bytes[count++] = static_cast<uint8_t>(high << 4 | low);
+    const size_t triples = text.size() / 3;
+    const size_t tail = text.size() % 3;  // 2: a last pair without its separator
+    if (tail == 1) return false;
+    bytes.resize(triples + tail / 2);
+    uint8_t* out = bytes.data();
+    int bad = 0;
+    for (size_t i = 0; i < triples; ++i, at += 3) {
+        const int byte = kHexPairs[at[0] | at[1] << 8];
+        bad |= byte | -static_cast<int>(at[2] != ' ');
+        out[i] = static_cast<uint8_t>(byte);
     }
-    bytes.resize(count);
+    if (tail == 2) {
+        const int byte = kHexPairs[at[0] | at[1] << 8];
+        bad |= byte;
+        out[triples] = static_cast<uint8_t>(byte);
+    }
+    return bad >= 0;
+}
+
+// Any hex text the general reader takes; throws std::invalid_argument as it does.
+void decodeReportHex(std::string_view text, std::vector<uint8_t>& bytes) {
+    if (!decodeWriterHex(text, bytes)) bytes = Util::bytesFromHexString(std::string(text));
+}
+
+}  // namespace
+
+std::vector<uint8_t> reportBytesFromHexText(std::string_view text) {
+    std::vector<uint8_t> bytes;
+    decodeReportHex(text, bytes);
     return bytes;
 }
 
@@ -178,11 +214,16 @@ Read readFrame(simdjson::ondemand::object object, PipelineRecording::Frame& fram
         if (seen != (kType | kTimestamp | kReport) && seen != (kType | kTimestamp | kReport | kWallTime)) {
             return Read::Undecided;
         }
+        // Filled in place: a reader that hands out the same frame again reuses its report's storage.
         try {
-            frame = PipelineRecording::Frame::inputReport(timestamp, reportBytesFromHexText(report));
+            decodeReportHex(report, frame.report);
         } catch (const std::invalid_argument&) {
             return Read::Undecided;
         }
+        frame.type = PipelineRecording::FrameType::InputReport;
+        frame.timestamp = timestamp;
+        frame.key.clear();
+        frame.value.reset();
         return Read::Frame;
     case Type::State:
         if (seen != (kType | kTimestamp | kKey) && seen != (kType | kTimestamp | kKey | kValue)) return Read::Undecided;

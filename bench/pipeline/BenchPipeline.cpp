@@ -5,7 +5,12 @@
 
 #include <cstring>
 #include <memory>
+#include <string>
+#include <string_view>
 #include <vector>
+
+#include <nlohmann/json.hpp>
+#include <simdjson.h>
 
 #include "pipeline/Pipeline.h"
 #include "pipeline/PipelineRecording.h"
@@ -73,6 +78,86 @@ void BM_ReadDocument(benchmark::State& state) {
     state.counters["bytes"] = static_cast<double>(document.size());
 }
 BENCHMARK(BM_ReadDocument)->Unit(benchmark::kMillisecond);
+
+// The anchors for the two above, on the same document in the same run. Reading's: simdjson's
+// ondemand parser walking every frame, every member and every value of the same bytes (copied
+// into simdjson's padded buffer first, as any reader of a byte vector must), strings unescaped and
+// numbers converted, keeping nothing. The ondemand parser runs the kernel the compiler flags allow
+// (the scalar one for the baseline x86-64 the packages target), the one the reader runs.
+void BM_AnchorSimdjsonOndemandParseAndWalk(benchmark::State& state) {
+    PipelineRecording recording = fullRecording();
+    const std::vector<uint8_t> document = recording.json();
+    simdjson::ondemand::parser parser;
+    for (auto _ : state) {
+        simdjson::padded_string text(reinterpret_cast<const char*>(document.data()), document.size());
+        simdjson::ondemand::document tree = parser.iterate(text);
+        size_t walked = 0;
+        for (simdjson::ondemand::field member : tree.get_object()) {
+            if (member.unescaped_key().value() != "Frames") {
+                walked += member.value().get_uint64().value();
+                continue;
+            }
+            for (simdjson::ondemand::object frame : member.value().get_array()) {
+                for (simdjson::ondemand::field field : frame) {
+                    const std::string_view key = field.unescaped_key().value();
+                    simdjson::ondemand::value value = field.value();
+                    if (key == "Timestamp") {
+                        walked += value.get_uint64().value();
+                    } else if (key == "Value") {
+                        walked += value.raw_json_token().size();
+                    } else {
+                        walked += value.get_string().value().size();
+                    }
+                }
+            }
+        }
+        benchmark::DoNotOptimize(walked);
+    }
+    state.counters["bytes"] = static_cast<double>(document.size());
+}
+BENCHMARK(BM_AnchorSimdjsonOndemandParseAndWalk)->Unit(benchmark::kMillisecond);
+
+// The same walk through simdjson's DOM parser, which picks the fastest kernel the processor has
+// when it runs: the best simdjson does on this machine.
+void BM_AnchorSimdjsonDomParseAndWalk(benchmark::State& state) {
+    PipelineRecording recording = fullRecording();
+    const std::vector<uint8_t> document = recording.json();
+    simdjson::dom::parser parser;
+    for (auto _ : state) {
+        simdjson::padded_string text(reinterpret_cast<const char*>(document.data()), document.size());
+        const simdjson::dom::element tree = parser.parse(text);
+        size_t walked = tree["Version"].get_uint64().value();
+        for (simdjson::dom::object frame : tree["Frames"].get_array()) {
+            for (const auto [key, value] : frame) {
+                if (key == "Timestamp") {
+                    walked += value.get_uint64().value();
+                } else if (value.is_string()) {
+                    walked += value.get_string().value().size();
+                } else {
+                    walked += static_cast<size_t>(value.type());
+                }
+            }
+        }
+        benchmark::DoNotOptimize(walked);
+    }
+    state.counters["bytes"] = static_cast<double>(document.size());
+}
+BENCHMARK(BM_AnchorSimdjsonDomParseAndWalk)->Unit(benchmark::kMillisecond);
+
+// Writing's: nlohmann's own dump(2) of a tree of the same content (the tree built beforehand).
+void BM_AnchorNlohmannDump2(benchmark::State& state) {
+    PipelineRecording recording = fullRecording();
+    const std::vector<uint8_t> document = recording.json();
+    const nlohmann::json tree = nlohmann::json::parse(document.begin(), document.end());
+    size_t bytes = 0;
+    for (auto _ : state) {
+        const std::string text = tree.dump(2);
+        bytes = text.size();
+        benchmark::DoNotOptimize(text.data());
+    }
+    state.counters["bytes"] = static_cast<double>(bytes);
+}
+BENCHMARK(BM_AnchorNlohmannDump2)->Unit(benchmark::kMillisecond);
 
 void BM_CopyRecording(benchmark::State& state) {
     const PipelineRecording recording = fullRecording();
