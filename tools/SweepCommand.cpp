@@ -59,7 +59,7 @@ void runSweep(const SweepArguments& arguments) {
             throw CLI::ValidationError("--grid", error.what());
         }
     }
-    const Workbench::Settings base = Workbench::settingsFromAssignments(arguments.corpus.settings);
+    const Workbench::Settings base = Workbench::settingsFromAssignments(arguments.corpus.allSettings());
     const std::vector<Workbench::Settings> points = Workbench::sweepPoints(axes, base);
 
     const Workbench::CorpusListing listing = arguments.corpus.listing();

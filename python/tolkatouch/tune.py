@@ -463,13 +463,18 @@ def _result(study, search: Search, corpus: Corpus, jobs: int) -> TuneResult:
 
 # --- the result as people and programs read it ---------------------------------------------------
 
-def resolution(evaluation: dict) -> Optional[float]:
-    """The smallest change of a rate the held-out gestures can tell from chance: two standard errors
-    of a proportion near 0.5 over the intended gestures, and never below one gesture in all."""
+RATE_METRICS = ("f1", "macro-f1", "precision", "recall", "tap-f1", "hold-f1", "slide-f1", "false-reject-rate")
+
+
+def resolution(evaluation: dict, name: str) -> Optional[float]:
+    """The smallest change of a rate metric that the held-out gestures tell from chance: two standard
+    errors of a proportion at the defaults' value over the intended gestures, and never below one
+    gesture in all. None for a metric that is not a rate, or without gestures."""
     gestures = evaluation["Counts"]["IntendedGestures"] if evaluation else 0
-    if not gestures:
+    value = metric(json.dumps(evaluation), name) if evaluation else None
+    if not gestures or name not in RATE_METRICS or value is None:
         return None
-    return max(1.0 / gestures, 2.0 * math.sqrt(0.25 / gestures))
+    return max(1.0 / gestures, 2.0 * math.sqrt(value * (1.0 - value) / gestures))
 
 
 def summary(result: TuneResult) -> str:
@@ -499,11 +504,13 @@ def summary(result: TuneResult) -> str:
     if before is None or after is None:
         lines.append(f"held out: {result.objective} has no value on the held-out part")
     else:
-        step = resolution(result.defaults.heldout)
+        step = resolution(result.defaults.heldout, result.objective)
         gestures = result.defaults.heldout["Counts"]["IntendedGestures"]
         line = f"held out: {result.objective} {before:.4f} with the defaults, {after:.4f} with the best ({after - before:+.4f})"
         if step is not None and abs(after - before) < step:
             line += f"; within what {gestures} held-out gestures can resolve (about {step:.4f})"
+        elif step is not None:
+            line += f"; beyond what {gestures} held-out gestures can resolve (about {step:.4f})"
         lines.append(line)
     return "\n".join(lines) + "\n"
 

@@ -83,6 +83,8 @@ def test_eval_with_the_best_settings_reproduces_the_held_out_result(corpus, tool
     evaluated = run_tool(tool, *arguments)
     assert evaluated.returncode == 0, evaluated.stderr
     assert json.loads(evaluated.stdout) == document["best"]["heldout"]
+    from_file = run_tool(tool, "eval", "--json", "--settings", str(settings_file), *document["heldout_recordings"])
+    assert json.loads(from_file.stdout) == document["best"]["heldout"]
 
 
 def test_a_study_resumed_from_storage_continues(corpus, tmp_path):
