@@ -30,7 +30,9 @@ read -r eval_wall eval_cpu < <(timed "$tool" eval -j 2 "$corpus")
 read -r tune_wall tune_cpu < <(timed "$tool" tune "$corpus" --trials 100 -j 2 --json --storage "journal:$work/study.log" "$@")
 counts=$(/usr/bin/python3 - "$work/study.log" <<'PYTHON'
 import sys
+import warnings
 import optuna
+warnings.simplefilter("ignore")
 study = optuna.load_study(study_name="tolkatouch-tune",
                           storage=optuna.storages.JournalStorage(optuna.storages.JournalFileStorage(sys.argv[1])))
 states = [t.state.name for t in study.trials]

@@ -283,6 +283,9 @@ def open_storage(url: Optional[str]):
 
     if url is None:
         return None
+    import warnings
+
+    warnings.filterwarnings("ignore", category=optuna.exceptions.ExperimentalWarning)
     try:
         if url.startswith("journal:"):
             path = url[len("journal:"):]
