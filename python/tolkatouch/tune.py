@@ -572,6 +572,11 @@ def main(argv: Optional[Sequence[str]] = None, prog: Optional[str] = None) -> in
     parser = arguments_parser(prog)
     arguments = parser.parse_args(argv)
     try:
+        import optuna  # noqa: F401
+    except ImportError as error:
+        print(f"tolkatouch: tune needs Optuna (Debian python3-optuna): {error}", file=sys.stderr)
+        return EXIT_FAILURE
+    try:
         result = tune(arguments.corpus, trials=arguments.trials, space=arguments.space, objective=arguments.objective,
                       max_false_activations_per_hour=arguments.max_false_activations_per_hour,
                       pareto=arguments.pareto, heldout=arguments.heldout, seed=arguments.seed,
