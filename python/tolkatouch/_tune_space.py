@@ -8,7 +8,7 @@ from __future__ import annotations
 from dataclasses import dataclass
 from typing import Dict, List, Optional, Sequence
 
-from . import SettingError, setting_assignments
+from . import SettingError
 from . import _tolkatouch as _core
 
 
@@ -121,7 +121,3 @@ def clamp_default(dimension: Dimension) -> Optional[object]:
     if dimension.low <= value <= dimension.high:
         return int(value) if dimension.kind == "int" else float(value)
     return None
-
-
-def assignments(settings: Dict[str, object]) -> List[str]:
-    return setting_assignments(settings)
