@@ -192,6 +192,7 @@ class Search:
     tolerance_us: int
     pareto: bool
     prune: bool
+    trials: int  # the study's trials in all, over every process sharing it
 
 
 def _settings_of(space: Sequence[Dimension], params: Dict[str, object]) -> Dict[str, object]:
@@ -206,6 +207,12 @@ def objective_function(search: Search, tuning: Sequence[Recording]):
     ends = sorted({max(1, math.ceil(share * len(tuning))) for share in SHARES})
 
     def run(trial):
+        if trial.number >= search.trials:
+            # Two processes sharing the study started a trial at the same moment past the count:
+            # the later one stops at once, marked, and counts nowhere.
+            trial.set_user_attr("surplus", True)
+            trial.study.stop()
+            raise optuna.TrialPruned()
         settings = {d.key: d.suggest(trial) for d in search.space}
         point = _assignments(settings)
         total, done = None, 0
@@ -353,12 +360,17 @@ def run_trials(study, search: Search, tuning: Sequence[Recording], trials: int, 
 
     TrialState = optuna.trial.TrialState
     begun = (TrialState.COMPLETE, TrialState.PRUNED, TrialState.FAIL, TrialState.RUNNING)
-    remaining = trials - len(study.get_trials(deepcopy=False, states=begun))
+    remaining = trials - len([t for t in study.get_trials(deepcopy=False, states=begun) if not t.user_attrs.get("surplus")])
     if remaining <= 0:
         return
     callback = optuna.study.MaxTrialsCallback(trials, states=begun)
     study.optimize(objective_function(search, tuning), n_trials=remaining, timeout=timeout, n_jobs=max(1, jobs),
                    catch=(Error, RuntimeError, ValueError), callbacks=[callback], gc_after_trial=False)
+
+
+def counted_trials(study) -> list:
+    """The study's trials but those stopped as surplus."""
+    return [t for t in study.get_trials(deepcopy=False) if not t.user_attrs.get("surplus")]
 
 
 def _feasible(trial) -> bool:
@@ -418,7 +430,8 @@ def tune(corpus: Sequence[str], trials: int = 100, space: Sequence[str] = (), ob
     limit = max_false_activations_per_hour
     if limit is None:
         limit = _defaults_limit(loaded, tolerance_us, jobs)
-    search = Search(dimensions, objective, limit, tolerance_us, pareto, prune=not pareto and pruner != "none")
+    search = Search(dimensions, objective, limit, tolerance_us, pareto, prune=not pareto and pruner != "none",
+                    trials=trials)
 
     optuna.logging.set_verbosity(optuna.logging.WARNING)
     opened = open_storage(storage)
@@ -440,7 +453,7 @@ def tune(corpus: Sequence[str], trials: int = 100, space: Sequence[str] = (), ob
 def _result(study, search: Search, corpus: Corpus, jobs: int) -> TuneResult:
     import optuna
 
-    all_trials = study.get_trials(deepcopy=False)
+    all_trials = counted_trials(study)
     states = [t.state for t in all_trials]
     chosen = best_trial(study, search)
     defaults = defaults_of(search.space)
