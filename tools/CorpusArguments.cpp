@@ -7,6 +7,7 @@
 #include <unistd.h>
 
 #include "tools/DocumentFile.h"
+#include "tools/SettingsFile.h"
 #include "common/PrintableText.h"
 
 namespace TolkaTouch::Tools {
@@ -27,7 +28,17 @@ void CorpusArguments::addTo(CLI::App& command, const char* pathsHelp) {
         ->expected(1)
         ->allow_extra_args(false)
         ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
+    command
+        .add_option("--settings", settingsFiles,
+                    "Apply the settings of a file, one KEY=VALUE a line (tune --write-settings writes one), before the "
+                    "--set ones (repeatable)")
+        ->type_name("FILE")
+        ->expected(1)
+        ->allow_extra_args(false)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
 }
+
+std::vector<std::string> CorpusArguments::allSettings() const { return settingsWithFiles(settingsFiles, settings); }
 
 Workbench::CorpusListing CorpusArguments::listing() const {
     std::vector<std::string> all = paths;

@@ -20,11 +20,14 @@ struct CorpusArguments {
     unsigned jobs = 0;  // 0: one per core
     double toleranceMs = 100.0;
     std::vector<std::string> settings;
+    std::vector<std::string> settingsFiles;
 
     void addTo(CLI::App& command, const char* pathsHelp);
     // The documents in order; paths that name nothing join the failures.
     Workbench::CorpusListing listing() const;
     unsigned threads() const;
+    // The --settings files' settings, then the --set ones.
+    std::vector<std::string> allSettings() const;
     int64_t toleranceUs() const;
 };
 

@@ -72,7 +72,7 @@ void runEval(const EvalArguments& arguments) {
         return;
     }
     Workbench::EvaluationOptions options;
-    options.settings = Workbench::settingsFromAssignments(arguments.corpus.settings);
+    options.settings = Workbench::settingsFromAssignments(arguments.corpus.allSettings());
     options.toleranceUs = arguments.corpus.toleranceUs();
     options.jobs = arguments.corpus.threads();
     Workbench::CorpusListing listing = arguments.corpus.listing();

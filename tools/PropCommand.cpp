@@ -7,6 +7,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <CLI/CLI.hpp>
@@ -17,6 +18,7 @@
 #include "tools/ControlClient.h"
 #include "tools/DocumentFile.h"
 #include "tools/SettingValue.h"
+#include "tools/SettingsFile.h"
 #include "tolkatouch/Settings.h"
 
 namespace TolkaTouch::Tools {
@@ -27,6 +29,7 @@ struct PropArguments {
     std::string socket = defaultControlSocketPath();
     std::string key;
     std::string value;
+    std::string file;
     std::optional<uint32_t> device;
 };
 
@@ -50,21 +53,37 @@ void runGet(const PropArguments& arguments) {
     printValue(reply.value("value", nlohmann::json()));
 }
 
-void runSet(const PropArguments& arguments) {
+void setProperty(const PropArguments& arguments, const std::string& givenKey, const std::string& text) {
     // A setting is checked against the settings table and sent in the property's own form; the
     // service's own keys and the device's pass as they are.
-    std::string key = arguments.key;
+    std::string key = givenKey;
     PropertyValue value;
     if (isSettingKeyForm(key)) {
-        const CheckedSetting checked = checkSetting(key, arguments.value);
+        const CheckedSetting checked = checkSetting(key, text);
         key = checked.setting->propertyKey();
         value = checked.value;
     } else {
-        value = settingValueFromText(arguments.value);
+        value = settingValueFromText(text);
     }
     nlohmann::json request = {{"set", key}, {"value", nlohmann::json(PropertyValueJson::toJson(value))}};
-    auto reply = controlRequest(arguments.socket, withDevice(request, arguments.device), arguments.key);
-    if (reply.value("ok", false) != true) throw ToolError(arguments.key, "the service did not take the value");
+    auto reply = controlRequest(arguments.socket, withDevice(request, arguments.device), givenKey);
+    if (reply.value("ok", false) != true) throw ToolError(givenKey, "the service did not take the value");
+}
+
+void runSet(const PropArguments& arguments) { setProperty(arguments, arguments.key, arguments.value); }
+
+// Every setting of the file is checked before the first is sent, so a bad line changes nothing.
+void runApply(const PropArguments& arguments) {
+    std::vector<std::pair<std::string, std::string>> settings;
+    for (const std::string& assignment : readSettingsFile(arguments.file)) {
+        const size_t equals = assignment.find('=');
+        std::string key = assignment.substr(0, equals);
+        std::string text = assignment.substr(equals + 1);
+        if (!isSettingKeyForm(key)) throw ToolError(arguments.file, "\"" + key + "\" is not a setting of the recognizer");
+        checkSetting(key, text);
+        settings.emplace_back(std::move(key), std::move(text));
+    }
+    for (const auto& [key, text] : settings) setProperty(arguments, key, text);
 }
 
 const char* typeName(SettingType type) {
@@ -133,6 +152,13 @@ void addPropCommand(CLI::App& app) {
         ->required();
     addSocketAndDevice(set, *arguments);
     set->callback([arguments] { runSet(*arguments); });
+
+    CLI::App* apply = prop->add_subcommand(
+        "apply", "Write every setting of a settings file (one KEY=VALUE a line, as tune --write-settings writes it); "
+                 "all are checked before the first is written.");
+    apply->add_option("FILE", arguments->file, "the settings file")->required();
+    addSocketAndDevice(apply, *arguments);
+    apply->callback([arguments] { runApply(*arguments); });
 
     CLI::App* list = prop->add_subcommand(
         "list", "List every setting the running service takes, with its type, current value and default.");

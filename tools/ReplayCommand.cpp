@@ -20,6 +20,7 @@
 #include "tools/ReplayProgress.h"
 #include "tools/Replayer.h"
 #include "tools/SampleRecording.h"
+#include "tools/SettingsFile.h"
 #include "tools/StatsPrinter.h"
 
 namespace TolkaTouch::Tools {
@@ -32,6 +33,7 @@ struct ReplayArguments {
     bool fast = false;
     bool json = false;
     std::vector<std::string> settings;
+    std::vector<std::string> settingsFiles;
     bool describe = false;
     bool stats = false;
 };
@@ -92,7 +94,7 @@ void runReplay(const ReplayArguments& arguments) {
         std::fprintf(stderr, "tolkatouch: a pause of %.1f s in the recording is cut to %.0f s\n",
                      static_cast<double>(microseconds) / 1e6, static_cast<double>(kMaxReplayPauseMicroseconds) / 1e6);
     };
-    for (const std::string& assignment : arguments.settings) {
+    for (const std::string& assignment : settingsWithFiles(arguments.settingsFiles, arguments.settings)) {
         const CheckedSetting checked = checkSettingAssignment(assignment);
         options.settings.emplace_back(checked.setting->algsKey(), checked.value);
     }
@@ -152,6 +154,13 @@ void addReplayCommand(CLI::App& app) {
         ->check(CLI::Validator(
             [](std::string& text) { return text.find('=') == std::string::npos ? std::string("expected KEY=VALUE") : std::string(); },
             ""));
+    command->add_option("--settings", arguments->settingsFiles,
+                        "Apply the settings of a file, one KEY=VALUE a line (tune --write-settings writes one), before "
+                        "the --set ones (repeatable)")
+        ->type_name("FILE")
+        ->expected(1)
+        ->allow_extra_args(false)
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
     command->add_flag("--describe", arguments->describe,
                       "Enable the debug level of the system log: per-frame statistics and descriptions go to standard error");
     command->add_flag("--stats", arguments->stats, "End with the pipeline's counters and the event statistics");

@@ -59,7 +59,7 @@ void runSweep(const SweepArguments& arguments) {
             throw CLI::ValidationError("--grid", error.what());
         }
     }
-    const Workbench::Settings base = Workbench::settingsFromAssignments(arguments.corpus.settings);
+    const Workbench::Settings base = Workbench::settingsFromAssignments(arguments.corpus.allSettings());
     const std::vector<Workbench::Settings> points = Workbench::sweepPoints(axes, base);
 
     const Workbench::CorpusListing listing = arguments.corpus.listing();
@@ -122,7 +122,7 @@ void addSweepCommand(CLI::App& app) {
         ->allow_extra_args(false)
         ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
     command->add_option("--metric", arguments->metric,
-                        "Rank by: f1 (default), precision, recall, tap-f1, hold-f1, slide-f1, false-activations-per-hour, "
+                        "Rank by: f1 (default), macro-f1, precision, recall, tap-f1, hold-f1, slide-f1, false-activations-per-hour, "
                         "false-reject-rate, tap-latency-median, hold-latency-median");
     CLI::Option* json = command->add_flag("--json", arguments->json, "Print every point's evaluation as JSON, best first");
     command->add_flag("--csv", arguments->csv, "Print one CSV row per point, best first")->excludes(json);

@@ -3,25 +3,26 @@
 _tolkatouch() {
     local cur prev words cword
     _init_completion || return
-    local subcommands="replay synth show convert eval sweep plot uhid keys prop devices log watch"
+    local subcommands="replay synth show convert eval sweep plot tune uhid keys prop devices log watch"
     if [[ $cword -eq 1 ]]; then
         COMPREPLY=($(compgen -W "$subcommands --help --version" -- "$cur"))
         return
     fi
     local options=""
     case ${words[1]} in
-        replay) options="--speed --fast --json --set --describe --stats --help" ;;
+        replay) options="--speed --fast --json --set --settings --describe --stats --help" ;;
         synth) options="--output --seed --labels --finger --noise --help" ;;
         show) options="--frame --from --to --summary --json --raw --help" ;;
         convert) options="--output --to --help" ;;
-        eval) options="--list --jobs --tolerance --set --json --shard --merge --help" ;;
-        sweep) options="--list --jobs --tolerance --set --grid --metric --json --csv --help" ;;
+        eval) options="--list --jobs --tolerance --set --settings --json --shard --merge --help" ;;
+        sweep) options="--list --jobs --tolerance --set --settings --grid --metric --json --csv --help" ;;
         plot) options="--output --from --to --set --help" ;;
+        tune) options="--trials --timeout --space --objective --max-false-activations-per-hour --pareto --heldout --seed --sampler --pruner --storage --study --jobs --tolerance --write-settings --plots --json --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)
             if [[ $cword -eq 2 ]]; then
-                COMPREPLY=($(compgen -W "get set list --help" -- "$cur"))
+                COMPREPLY=($(compgen -W "get set apply list --help" -- "$cur"))
                 return
             fi
             options="--socket --help" ;;

@@ -7,6 +7,7 @@
 #include "EvaluateBinding.h"
 #include "RecordingBinding.h"
 #include "ReplayBinding.h"
+#include "SettingsBinding.h"
 #include "SynthBinding.h"
 
 PYBIND11_MODULE(_tolkatouch, module) {
@@ -16,4 +17,5 @@ PYBIND11_MODULE(_tolkatouch, module) {
     TolkaTouch::Python::addReplay(module);
     TolkaTouch::Python::addSynth(module);
     TolkaTouch::Python::addEvaluate(module);
+    TolkaTouch::Python::addSettings(module);
 }

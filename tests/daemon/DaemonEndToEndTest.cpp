@@ -229,6 +229,26 @@ TEST_F(DaemonEndToEndTest, PropListShowsEverySettingAndPropSetRefusesAMisspeltOn
     EXPECT_EQ(daemon->wait(10s), 0);
 }
 
+TEST_F(DaemonEndToEndTest, PropApplyWritesEverySettingOfAFileAndNoneWhenOneIsBad) {
+    auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
+    ::close(connectControl());
+    std::string out, err;
+    std::ofstream(file("best.settings")) << "Algs.ActivationThreshold=173.5\nAlgs.HoldTimeoutMilliseconds=584\n";
+    ASSERT_EQ(tool({"prop", "apply", file("best.settings")}, &out, &err), 0) << err;
+    ASSERT_EQ(tool({"prop", "get", "Pipeline.Algs.HoldTimeoutMilliseconds"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "584\n");
+    ASSERT_EQ(tool({"prop", "get", "Pipeline.Algs.ActivationThreshold"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "173.5\n");
+
+    std::ofstream(file("bad.settings")) << "Algs.HoldTimeoutMilliseconds=900\nAlgs.ActivationThreshold=0\n";
+    EXPECT_EQ(tool({"prop", "apply", file("bad.settings")}, &out, &err), 2);
+    EXPECT_EQ(err, "tolkatouch: setting \"Algs.ActivationThreshold\" takes a number from 1 to 10000, not \"0\"\n");
+    ASSERT_EQ(tool({"prop", "get", "Pipeline.Algs.HoldTimeoutMilliseconds"}, &out, &err), 0) << err;
+    EXPECT_EQ(out, "584\n");
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
 TEST_F(DaemonEndToEndTest, TolkatouchLogTurnsTheDescriptionLinesOnAndOffOnTheRunningService) {
     auto daemon = startDaemon(synthesize("long-hold.gestures"), {"--no-keys"});
     ::close(connectControl());

@@ -48,6 +48,17 @@ tolka_add_cli_test(ReplaySetIsRepeatable
   --stdout ${expected}/version0-session.no-holds.jsonl
   -- replay --fast --json --set Algs.HoldTimeoutMilliseconds=5000 --set Algs.EnableTapSuppression=false
      ${examples}/version0-session.json)
+tolka_add_cli_test(ReplaySettingsFileAppliesItsSettingsLikeSet
+  --stdout ${expected}/everyday-session.hold-timeout-1000.jsonl --stderr-empty
+  -- replay --fast --json --settings ${data}/hold-timeout-1000.settings ${examples}/everyday-session.json)
+tolka_add_cli_test(ReplaySetWinsOverTheSettingsFile
+  --stdout ${expected}/everyday-session.jsonl --stderr-empty
+  -- replay --fast --json --settings ${data}/hold-timeout-1000.settings --set Algs.HoldTimeoutMilliseconds=500
+     ${examples}/everyday-session.json)
+tolka_add_cli_test(ReplayRefusesASettingsFileLineWithoutEquals
+  --exit 1 --stdout-empty
+  --stderr-text "tolkatouch: ${data}/no-equals.settings: line 2: expected KEY=VALUE"
+  -- replay --fast --settings ${data}/no-equals.settings ${examples}/everyday-session.json)
 tolka_add_cli_test(ReplayDescribeWritesTheDescriptionsToStandardError
   --stdout ${expected}/version0-session.jsonl --stderr-contains "*** Virtual State Description ***"
   -- replay --fast --json --describe ${examples}/version0-session.json)

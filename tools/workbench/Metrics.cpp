@@ -61,6 +61,21 @@ std::optional<double> falseActivationsPerHour(const Counts& counts) {
 
 std::optional<double> falseRejectRate(const Counts& counts) { return ratio(counts.falseRejects, counts.intendedGestures); }
 
+std::optional<double> macroF1(const Counts& counts) {
+    double sum = 0.0;
+    size_t classes = 0;
+    for (const auto& zones : counts.classes) {
+        for (const ClassCounts& cell : zones) {
+            const std::optional<double> f1 = ratesOf(cell).f1;
+            if (cell.truePositives + cell.falsePositives + cell.falseNegatives == 0) continue;
+            sum += f1.value_or(0.0);
+            ++classes;
+        }
+    }
+    if (classes == 0) return std::nullopt;
+    return sum / static_cast<double>(classes);
+}
+
 std::string_view scoredKindName(size_t kind) {
     static constexpr std::string_view kNames[] = {"tap", "hold", "slide"};
     return kind < kScoredKindCount ? kNames[kind] : "";

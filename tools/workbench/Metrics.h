@@ -32,6 +32,10 @@ ClassCounts overallTotal(const Counts& counts);
 std::optional<double> percentileMs(const std::vector<int64_t>& sortedUs, double percent);
 LatencySummary latencyOf(const std::vector<int64_t>& sortedUs);
 
+// The mean F1 of the tap, hold and slide classes of each zone that saw any gesture or label: every
+// kind and zone weighs the same, however many gestures it has.
+std::optional<double> macroF1(const Counts& counts);
+
 // Recognised gestures per hour of noise-only recording.
 std::optional<double> falseActivationsPerHour(const Counts& counts);
 // Tap, hold and slide labels recognised as nothing, of all of them.

@@ -113,7 +113,7 @@ std::vector<SweepResult> runSweep(const LoadedCorpus& corpus, const std::vector<
 }
 
 const std::vector<std::string>& sweepMetricNames() {
-    static const std::vector<std::string> names{"f1", "precision", "recall", "tap-f1", "hold-f1", "slide-f1",
+    static const std::vector<std::string> names{"f1", "macro-f1", "precision", "recall", "tap-f1", "hold-f1", "slide-f1",
                                                 "false-activations-per-hour", "false-reject-rate", "tap-latency-median",
                                                 "hold-latency-median"};
     return names;
@@ -126,6 +126,7 @@ bool isSweepMetric(std::string_view name) {
 
 std::optional<double> metricValue(const Counts& counts, std::string_view name) {
     if (name == "f1") return ratesOf(overallTotal(counts)).f1;
+    if (name == "macro-f1") return macroF1(counts);
     if (name == "precision") return ratesOf(overallTotal(counts)).precision;
     if (name == "recall") return ratesOf(overallTotal(counts)).recall;
     if (name == "tap-f1") return ratesOf(kindTotal(counts, 0)).f1;

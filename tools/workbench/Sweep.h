@@ -35,7 +35,7 @@ struct SweepResult {
 std::vector<SweepResult> runSweep(const LoadedCorpus& corpus, const std::vector<Settings>& points, int64_t toleranceUs, unsigned jobs,
                                   const std::function<void(size_t done, size_t total)>& progress = {});
 
-// Metrics a sweep ranks by: f1, precision, recall, tap-f1, hold-f1, slide-f1,
+// Metrics a sweep ranks by: f1, macro-f1 (mean F1 over kinds and zones), precision, recall, tap-f1, hold-f1, slide-f1,
 // false-activations-per-hour, false-reject-rate, tap-latency-median, hold-latency-median.
 const std::vector<std::string>& sweepMetricNames();
 bool isSweepMetric(std::string_view name);

@@ -140,5 +140,14 @@ TEST(MatchingTest, RecordingWithLabelsAddsNothingToTheNoiseOnlyTime) {
     EXPECT_EQ(falseRejectRate(counts), 1.0);
 }
 
+TEST(MatchingTest, MacroF1WeighsEveryKindAndZoneThatSawAGestureTheSame) {
+    Counts counts;
+    counts.classes[kTap][0] = ClassCounts{9, 0, 0};   // F1 1
+    counts.classes[kHold][1] = ClassCounts{1, 1, 0};  // F1 2/3
+    counts.classes[kSlide][2] = ClassCounts{0, 0, 3};  // no recall: F1 0
+    EXPECT_DOUBLE_EQ(*macroF1(counts), (1.0 + 2.0 / 3.0 + 0.0) / 3.0);
+    EXPECT_EQ(macroF1(Counts{}), std::nullopt);
+}
+
 }  // namespace
 }  // namespace TolkaTouch::Workbench
