@@ -1,0 +1,82 @@
+#!/bin/bash
+# record's ways to end, each leaving a whole recording that replays to the same events as what
+# was recorded: the source running dry (as a device that disappears), --max-reports, --duration,
+# SIGINT and SIGTERM; with --rotate every numbered file replays on its own; -o - and
+# --with-events. The "device" is a byte stream of reports (a file or a pipe), which record cuts
+# into reports by their IDs as it cuts a hidraw node's reads.
+# Usage: record_check.sh TOLKATOUCH WORKDIR
+set -uo pipefail
+tool="$1"
+work="$2"
+rm -rf "$work"
+mkdir -p "$work"
+fail() { echo "record_check: $*"; exit 1; }
+record() { "$tool" record --socket "$work/no-service.sock" "$@"; }
+
+printf 'wait 300ms\ntap volume-up 120ms\nwait 500ms\nhold play-pause 900ms\nwait 400ms\ntap volume-down 100ms\nwait 300ms\n' >"$work/script.txt"
+"$tool" synth "$work/script.txt" -o "$work/source.json" || fail "synth failed"
+/usr/bin/python3 -c '
+import json, sys
+document = json.load(open(sys.argv[1]))
+with open(sys.argv[2], "wb") as out:
+    for frame in document["Frames"]:
+        if frame["Type"] == "InputReport":
+            out.write(bytes.fromhex(frame["Report"]))
+' "$work/source.json" "$work/reports.bin" || fail "cannot extract the reports"
+reports=$(( $(stat -c %s "$work/reports.bin") / 73 ))
+events() { "$tool" replay --fast "$1" | awk '{print $4, $6}'; }
+events "$work/source.json" >"$work/expected.txt"
+[ -s "$work/expected.txt" ] || fail "the source gives no events"
+
+# The source runs dry: exit 1, one clear line, and the recording is whole.
+record --device "$work/reports.bin" -o "$work/dry.jsonl" 2>"$work/dry.err"
+status=$?
+[ "$status" = 1 ] || fail "a source that runs dry exits $status, not 1"
+grep -qx "tolkatouch: $work/reports.bin: no more reports; the recording ends there and is complete in $work/dry.jsonl" "$work/dry.err" ||
+  fail "unexpected message: $(cat "$work/dry.err")"
+events "$work/dry.jsonl" | cmp -s - "$work/expected.txt" || fail "the recording replays to other events"
+head -1 "$work/dry.jsonl" | grep -q '"Format":"lines"' || fail "no header line"
+[ "$(grep -c '"WallTime"' "$work/dry.jsonl")" = "$reports" ] || fail "not every report has its wall-clock time"
+grep -q '"Key":"Algs.HoldTimeoutMilliseconds","Value":500' "$work/dry.jsonl" || fail "the default settings are not recorded"
+
+# --max-reports.
+record --device "$work/reports.bin" --max-reports 50 -o "$work/max.jsonl" || fail "--max-reports exits non-zero"
+[ "$(grep -c '"InputReport"' "$work/max.jsonl")" = 50 ] || fail "--max-reports 50 did not record 50 reports"
+
+# -o - and --with-events: the event lines are the recognizer's on the same reports.
+record --device "$work/reports.bin" --with-events -o - >"$work/stdout.jsonl" 2>/dev/null
+[ "$(grep -c '"Type":"Event"' "$work/stdout.jsonl")" = "$(wc -l <"$work/expected.txt")" ] || fail "--with-events did not store every event"
+events "$work/stdout.jsonl" | cmp -s - "$work/expected.txt" || fail "-o - replays to other events"
+
+# --rotate: numbered files, each a recording of its own.
+record --device "$work/reports.bin" --rotate 16K -o "$work/rotated.jsonl" 2>/dev/null
+files=("$work"/rotated.*.jsonl)
+[ "${#files[@]}" -ge 3 ] || fail "--rotate 16K made ${#files[@]} files"
+total=0
+for file in "${files[@]}"; do
+  "$tool" replay --fast "$file" >/dev/null || fail "$file does not replay"
+  total=$((total + $(grep -c '"InputReport"' "$file")))
+done
+[ "$total" = "$reports" ] || fail "the rotated files hold $total of $reports reports"
+
+# SIGINT, SIGTERM and --duration while the source is still open: a FIFO the script keeps open.
+mkfifo "$work/fifo"
+for way in INT TERM duration; do
+  exec 3<>"$work/fifo"
+  cat "$work/reports.bin" >&3
+  if [ "$way" = duration ]; then
+    record --device "$work/fifo" --duration 1 -o "$work/$way.jsonl"
+    status=$?
+  else
+    "$tool" record --socket "$work/no-service.sock" --device "$work/fifo" -o "$work/$way.jsonl" &
+    pid=$!
+    sleep 1.5
+    kill -"$way" "$pid"
+    wait "$pid"
+    status=$?
+  fi
+  exec 3>&-
+  [ "$status" = 0 ] || fail "recording ended by $way exits $status"
+  events "$work/$way.jsonl" | cmp -s - "$work/expected.txt" || fail "recording ended by $way replays to other events"
+done
+echo "record: every way to end leaves a whole recording"
