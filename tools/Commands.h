@@ -25,6 +25,7 @@ void addWatchCommand(CLI::App& app);
 void addEvalCommand(CLI::App& app);
 void addSweepCommand(CLI::App& app);
 void addPlotCommand(CLI::App& app);
+void addPlotEvalCommand(CLI::App& app);
 void addRecordCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

@@ -87,7 +87,8 @@ ReportSource::Outcome ReportSource::next(int timeoutMs) {
         if (length < 0) {
             if (errno == EAGAIN || errno == EINTR) continue;
             outcome.status = Status::Gone;
-            outcome.reason = std::strerror(errno);
+            // A hidraw node whose device was unplugged fails its reads with EIO or ENODEV.
+            outcome.reason = _hidraw && (errno == EIO || errno == ENODEV) ? "the device is gone" : std::strerror(errno);
             return outcome;
         }
         if (length == 0) {

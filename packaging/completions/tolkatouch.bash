@@ -3,7 +3,7 @@
 _tolkatouch() {
     local cur prev words cword
     _init_completion || return
-    local subcommands="replay synth show convert eval sweep plot uhid keys prop devices log watch"
+    local subcommands="replay synth show convert eval sweep plot plot-eval record uhid keys prop devices log watch"
     if [[ $cword -eq 1 ]]; then
         COMPREPLY=($(compgen -W "$subcommands --help --version" -- "$cur"))
         return
@@ -17,6 +17,8 @@ _tolkatouch() {
         eval) options="--list --jobs --tolerance --set --json --shard --merge --help" ;;
         sweep) options="--list --jobs --tolerance --set --grid --metric --json --csv --help" ;;
         plot) options="--output --from --to --set --help" ;;
+        plot-eval) options="--output --kind --setting --metric --point --help" ;;
+        record) options="--output --device --vendor --product --duration --max-reports --rotate --with-events --socket --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)
@@ -39,7 +41,9 @@ _tolkatouch() {
         watch) options="--json --socket --help" ;;
     esac
     case $prev in
-        -o|--output|--socket|--uhid|--list|--labels) _filedir; return ;;
+        -o|--output|--socket|--uhid|--list|--labels|--device) _filedir; return ;;
+        --kind) COMPREPLY=($(compgen -W "confusion metric det" -- "$cur")); return ;;
+        --metric) [[ ${words[1]} == plot-eval ]] && { COMPREPLY=($(compgen -W "F1 Precision Recall" -- "$cur")); return; } ;;
         --finger) COMPREPLY=($(compgen -W "light normal heavy" -- "$cur")); return ;;
         --to) COMPREPLY=($(compgen -W "document lines" -- "$cur")); return ;;
     esac

@@ -46,13 +46,28 @@ def swept_key(evaluations: List[dict]) -> Optional[str]:
     return None
 
 
+def other_settings(evaluation: dict, key: str) -> dict:
+    """The evaluation's settings other than `key` (in either of its spellings)."""
+    names = {key, f"Algs.{key}", key.removeprefix("Pipeline.")}
+    return {k: v for k, v in evaluation.get("Settings", {}).items() if k not in names}
+
+
+def varies(evaluations: List[dict], key: str) -> bool:
+    return len({repr(e.get("Settings", {}).get(key)) for e in evaluations}) > 1
+
+
 def metric_figure(evaluations: List[dict], key: str, metric: str = "F1") -> Figure:
-    """The metric (F1, Precision or Recall) of each gesture kind against the setting `key`."""
+    """The metric (F1, Precision or Recall) of each gesture kind against the setting `key`. Where
+    other settings vary too, the points that share the first point's other settings (a sweep's
+    best) are drawn, as the title says."""
     figure = Figure(figsize=(8, 5), layout="constrained")
     ax = figure.subplots()
-    points = sorted((setting_value(e, key), e) for e in evaluations if setting_value(e, key) is not None)
-    if not points:
+    with_key = [e for e in evaluations if setting_value(e, key) is not None]
+    if not with_key:
         raise ValueError(f'no evaluation sets "{key}"')
+    others = other_settings(with_key[0], key)
+    points = sorted(((setting_value(e, key), e) for e in with_key if other_settings(e, key) == others),
+                    key=lambda point: point[0])
     x = [p[0] for p in points]
     for kind in KINDS:
         y = [p[1]["Metrics"]["Kinds"][kind][metric] for p in points]
@@ -64,7 +79,8 @@ def metric_figure(evaluations: List[dict], key: str, metric: str = "F1") -> Figu
     ax.set_xlabel(key)
     ax.set_ylabel(metric)
     ax.set_ylim(-0.02, 1.02)
-    ax.set_title(f"{metric} per gesture kind against {key}")
+    held = [f"{k.removeprefix('Algs.')}={v}" for k, v in others.items() if varies(with_key, k)]
+    ax.set_title(f"{metric} per gesture kind against {key}" + (f"\n({', '.join(held)})" if held else ""))
     ax.grid(alpha=0.3)
     ax.legend(title="gesture kind")
     return figure

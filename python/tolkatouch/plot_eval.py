@@ -5,7 +5,7 @@ rejects against false activations per hour, log axes) and the confusion matrix.
                                     [--kind metric|det|confusion] [--setting KEY] [--metric F1|Precision|Recall]
                                     [--point N]
 
-RESULTS.json is what `tolkatouch eval --json`, `tolkatouch sweep --json` or
+`tolkatouch plot-eval` runs this module. RESULTS.json is what `tolkatouch eval --json`, `tolkatouch sweep --json` or
 `python3 -m tolkatouch.evaluate` writes. --kind metric and det need several settings points;
 confusion draws point N (default 0: the first, the best of a sweep).
 """
@@ -14,6 +14,7 @@ from __future__ import annotations
 
 import argparse
 import json
+import os
 import sys
 from typing import Optional, Sequence
 
@@ -25,8 +26,8 @@ from ._eval_figures import confusion_figure, det_figure, evaluations_of, metric_
 from .plot import output_format, printable  # noqa: E402
 
 
-def main(argv: Optional[Sequence[str]] = None) -> int:
-    parser = argparse.ArgumentParser(prog="python3 -m tolkatouch.plot_eval", description="Draw evaluations.")
+def main(argv: Optional[Sequence[str]] = None, prog: Optional[str] = None) -> int:
+    parser = argparse.ArgumentParser(prog=prog, description="Draw evaluations.")
     parser.add_argument("results", metavar="RESULTS.json", help="eval --json, sweep --json or tolkatouch.evaluate output")
     parser.add_argument("-o", "--output", required=True, metavar="OUT", help="image to write: .png, .svg or .pdf")
     parser.add_argument("--kind", choices=("metric", "det", "confusion"), default="confusion",
@@ -63,4 +64,4 @@ def main(argv: Optional[Sequence[str]] = None) -> int:
 
 
 if __name__ == "__main__":
-    sys.exit(main())
+    sys.exit(main(prog=os.environ.get("TOLKATOUCH_PLOT_PROG")))
