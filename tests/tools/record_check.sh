@@ -68,7 +68,7 @@ for way in INT TERM duration; do
     record --device "$work/fifo" --duration 1 -o "$work/$way.jsonl"
     status=$?
   else
-    "$tool" record --socket "$work/no-service.sock" --device "$work/fifo" -o "$work/$way.jsonl" &
+    "$tool" record --socket "$work/no-service.sock" --device "$work/fifo" -o "$work/$way.jsonl" 2>"$work/$way.err" &
     pid=$!
     sleep 1.5
     kill -"$way" "$pid"
@@ -79,4 +79,27 @@ for way in INT TERM duration; do
   [ "$status" = 0 ] || fail "recording ended by $way exits $status"
   events "$work/$way.jsonl" | cmp -s - "$work/expected.txt" || fail "recording ended by $way replays to other events"
 done
+
+# A recording cut off in the middle of a line (a crash, a power loss) still replays up to its last
+# whole line, saying what it left out.
+size=$(stat -c %s "$work/dry.jsonl")
+head -c $((size / 2)) "$work/dry.jsonl" >"$work/cut.jsonl"
+"$tool" replay --fast "$work/cut.jsonl" >"$work/cut.txt" 2>"$work/cut.err" || fail "a cut-off recording does not replay"
+grep -q "^tolkatouch: $work/cut.jsonl: warning: the last line (line [0-9]*) is cut off and is left out" "$work/cut.err" ||
+  fail "no warning for the cut-off line: $(cat "$work/cut.err")"
+[ -s "$work/cut.txt" ] || fail "the cut-off recording replays to nothing"
+"$tool" convert --to lines -o "$work/repaired.jsonl" "$work/cut.jsonl" 2>/dev/null || fail "convert does not take a cut-off recording"
+"$tool" replay --fast "$work/repaired.jsonl" 2>"$work/repaired.err" | cmp -s - "$work/cut.txt" || fail "the converted recording replays to other events"
+[ ! -s "$work/repaired.err" ] || fail "the converted recording is not clean: $(cat "$work/repaired.err")"
+
+# On a terminal, a status line; elsewhere, nothing on standard error.
+if command -v script >/dev/null; then
+  exec 3<>"$work/fifo"
+  cat "$work/reports.bin" >&3
+  script -qec "'$tool' record --socket '$work/no-service.sock' --device '$work/fifo' --duration 1.2 -o '$work/tty.jsonl'" /dev/null >"$work/tty.out"
+  exec 3>&-
+  grep -aq "recording [0-9.]* s, $reports reports, [0-9.]* frames/s, [0-9]* gestures, [0-9.]* MB" "$work/tty.out" ||
+    fail "no status line on a terminal: $(cat -v "$work/tty.out")"
+fi
+[ ! -s "$work/INT.err" ] || fail "record wrote to standard error off a terminal: $(cat "$work/INT.err")"
 echo "record: every way to end leaves a whole recording"
