@@ -29,9 +29,9 @@ public:
     ~RecordOutput();
 
     RecordingLinesWriter& writer() { return *_writer; }
-    // Bytes written to the current file (flushed or still in the writer's buffer).
-    uint64_t fileBytes() const { return _fileBytes + _pendingBytes; }
-    uint64_t totalBytes() const { return _totalBytes + _pendingBytes; }
+    // Bytes written to the current file and in all, flushed or still in the writer's buffer.
+    uint64_t fileBytes() const { return _fileBytes + bufferedBytes(); }
+    uint64_t totalBytes() const { return _totalBytes + bufferedBytes(); }
     uint64_t fileStartNs() const { return _fileStartNs; }
     const std::string& currentPath() const { return _currentPath; }
 
@@ -44,6 +44,7 @@ public:
 private:
     void open(uint64_t nowNs);
     std::string numberedPath() const;
+    uint64_t bufferedBytes() const { return _writer ? _writer->bufferedBytes() : 0; }
 
     std::string _path;
     bool _rotating = false;
@@ -55,7 +56,6 @@ private:
     uint64_t _fileStartNs = 0;
     uint64_t _fileBytes = 0;
     uint64_t _totalBytes = 0;
-    uint64_t _pendingBytes = 0;  // never known exactly before a flush: counted as 0
 };
 
 }  // namespace TolkaTouch::Tools

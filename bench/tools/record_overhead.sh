@@ -25,6 +25,8 @@ with open(sys.argv[2], "wb") as out:
             out.write(bytes.fromhex(frame["Report"]))
 PY
 mkfifo "$work/fifo"
+# Held open here, so that record never sees the FIFO without a writer (an end of file).
+exec 3<>"$work/fifo"
 # The feeder: one 73-byte report every 8 ms, on a schedule that does not drift.
 /usr/bin/python3 - "$work/reports.bin" "$work/fifo" <<'PY' &
 import sys, time

@@ -55,6 +55,7 @@ files=("$work"/rotated.*.jsonl)
 total=0
 for file in "${files[@]}"; do
   "$tool" replay --fast "$file" >/dev/null || fail "$file does not replay"
+  [ "$(stat -c %s "$file")" -le $((16384 + 400)) ] || fail "$file is larger than 16K and a report"
   total=$((total + $(grep -c '"InputReport"' "$file")))
 done
 [ "$total" = "$reports" ] || fail "the rotated files hold $total of $reports reports"
