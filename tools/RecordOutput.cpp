@@ -1,6 +1,8 @@
 #include "tools/RecordOutput.h"
 
+#include <cctype>
 #include <cerrno>
+#include <charconv>
 #include <cmath>
 #include <cstring>
 #include <system_error>
@@ -15,11 +17,8 @@ std::optional<Rotation> rotationFromText(const std::string& text) {
     while (end < text.size() && (std::isdigit(static_cast<unsigned char>(text[end])) != 0 || text[end] == '.')) ++end;
     if (end == 0) return std::nullopt;
     double value = 0.0;
-    try {
-        value = std::stod(text.substr(0, end));
-    } catch (const std::exception&) {
-        return std::nullopt;
-    }
+    const auto [stop, error] = std::from_chars(text.data(), text.data() + end, value);
+    if (error != std::errc() || stop != text.data() + end) return std::nullopt;
     const std::string unit = text.substr(end);
     Rotation rotation;
     const auto bytes = [&](double scale) { rotation.bytes = static_cast<uint64_t>(std::llround(value * scale)); };
