@@ -5,15 +5,16 @@
 
 #include <condition_variable>
 #include <cstdint>
+#include <functional>
 #include <mutex>
 
-#include "platform/HIDDevice.h"
+#include "daemon/WrappingHIDDevice.h"
 
 namespace TolkaTouch {
 
-class CountingHIDDevice : public HIDDevice {
+class CountingHIDDevice : public WrappingHIDDevice {
 public:
-    explicit CountingHIDDevice(HIDDeviceRef inner);
+    explicit CountingHIDDevice(HIDDeviceRef inner) : WrappingHIDDevice(std::move(inner)) {}
 
     // Input reports handled by the registered callback so far.
     uint64_t deliveredCount() const;
@@ -22,36 +23,10 @@ public:
     // Wakes waitForDelivered so that it asks `abandon` again.
     void wakeWaiters();
 
-    uint32_t open(uint32_t options) override { return _inner->open(options); }
-    uint32_t close(uint32_t options) override { return _inner->close(options); }
-    PropertyValue getProperty(std::string_view key) const override { return _inner->getProperty(key); }
-    bool setProperty(std::string_view key, PropertyValue value) override {
-        return _inner->setProperty(key, std::move(value));
-    }
-    uint32_t getReport(HIDReportType type, uint32_t reportID, uint8_t* buffer, size_t& length) override {
-        return _inner->getReport(type, reportID, buffer, length);
-    }
-    void registerInputReportCallback(uint8_t* buffer, size_t length, InputReportCallback callback,
-                                     void* context) override;
-    void scheduleWithRunLoop(RunLoop& runLoop, const std::string& mode) override {
-        _inner->scheduleWithRunLoop(runLoop, mode);
-    }
-    void unscheduleFromRunLoop(RunLoop& runLoop, const std::string& mode) override {
-        _inner->unscheduleFromRunLoop(runLoop, mode);
-    }
-    void setRemovalHandler(std::function<void()> handler) override {
-        _inner->setRemovalHandler(std::move(handler));
-    }
+protected:
+    void afterInputReport() override;
 
 private:
-    static void deliver(void* context, uint32_t result, void* sender, HIDReportType type, uint32_t reportID,
-                        const uint8_t* report, size_t length, uint64_t timestamp);
-
-    HIDDeviceRef _inner;
-    // Set only while no report is in flight (registration waits for a callback that runs).
-    InputReportCallback _callback = nullptr;
-    void* _context = nullptr;
-
     mutable std::mutex _mutex;
     std::condition_variable _changed;
     uint64_t _delivered = 0;

@@ -9,6 +9,7 @@
 #include <nlohmann/json.hpp>
 #include <simdjson.h>
 
+#include "common/PrintableText.h"
 #include "pipeline/RecordingFrameJson.h"
 #include "platform/PropertyValueJson.h"
 
@@ -150,23 +151,6 @@ std::string containerProblem(const std::string& message) {
 
 }  // namespace
 
-std::string escapeControl(std::string_view text) {
-    static constexpr char kDigits[] = "0123456789abcdef";
-    std::string out;
-    out.reserve(text.size());
-    for (const char c : text) {
-        const auto byte = static_cast<unsigned char>(c);
-        if (byte < 0x20 || byte == 0x7f) {
-            out += "\\x";
-            out += kDigits[byte >> 4];
-            out += kDigits[byte & 0xF];
-        } else {
-            out += c;
-        }
-    }
-    return out;
-}
-
 SyntaxProblem findSyntaxProblem(const uint8_t* data, size_t size) {
     static const uint8_t empty = 0;
     if (data == nullptr) data = &empty, size = 0;
@@ -176,7 +160,7 @@ SyntaxProblem findSyntaxProblem(const uint8_t* data, size_t size) {
         return {std::nullopt,
                 "arrays and objects nested deeper than " + std::to_string(PropertyValueJson::kMaxNestingDepth) + " levels"};
     }
-    if (!parsed && finder.offset) return {finder.offset, escapeControl(finder.reason)};
+    if (!parsed && finder.offset) return {finder.offset, printableText(finder.reason)};
     if (finder.scalarTop) return {std::nullopt, "the text is a single value, not an object"};
     return {};
 }

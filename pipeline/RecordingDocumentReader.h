@@ -41,7 +41,4 @@ struct SyntaxProblem {
 };
 SyntaxProblem findSyntaxProblem(const uint8_t* data, size_t size);
 
-// Text from the input made safe for a terminal: control characters and DEL as \xNN.
-std::string escapeControl(std::string_view text);
-
 }  // namespace TolkaTouch::RecordingDocumentReader

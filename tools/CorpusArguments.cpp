@@ -7,7 +7,7 @@
 #include <unistd.h>
 
 #include "tools/DocumentFile.h"
-#include "tools/PrintableText.h"
+#include "common/PrintableText.h"
 
 namespace TolkaTouch::Tools {
 

@@ -10,6 +10,7 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include "common/PrintableText.h"
 #include "pipeline/RecordingDocumentReader.h"
 
 namespace TolkaTouch::Tools {
@@ -82,8 +83,8 @@ namespace {
 std::function<void(const std::string&)> warningsTo(const std::string& subject) {
     return [subject](const std::string& message) {
         std::fflush(stdout);
-        std::fprintf(stderr, "tolkatouch: %s: warning: %s\n", RecordingDocumentReader::escapeControl(subject).c_str(),
-                     RecordingDocumentReader::escapeControl(message).c_str());
+        std::fprintf(stderr, "tolkatouch: %s: warning: %s\n", printableText(subject).c_str(),
+                     printableText(message).c_str());
     };
 }
 

@@ -15,7 +15,7 @@
 #include "tolkatouch/Settings.h"
 #include "tolkatouch/VersionText.h"
 #include "tools/DocumentFile.h"
-#include "tools/PrintableText.h"
+#include "common/PrintableText.h"
 
 namespace {
 
@@ -23,7 +23,7 @@ constexpr int kExitFailure = 1;
 constexpr int kExitUsage = 2;
 
 // An error line may quote what came from outside: shown with its control characters escaped.
-std::string printable(const std::string& text) { return TolkaTouch::Tools::printableText(text); }
+std::string printable(const std::string& text) { return TolkaTouch::printableText(text); }
 
 }  // namespace
 

@@ -42,16 +42,5 @@ TEST(CountingHIDDeviceTest, WaitEndsWhenAbandoned) {
     EXPECT_EQ(device.deliveredCount(), 0u);
 }
 
-TEST(CountingHIDDeviceTest, OtherCallsReachTheInnerDevice) {
-    auto inner = SimulatedHIDDevice::create();
-    inner->setDeviceProperty("VendorID", PropertyValue(0x1209u));
-    CountingHIDDevice device(inner);
-    EXPECT_EQ(device.getProperty("VendorID"), PropertyValue(0x1209u));
-    EXPECT_EQ(device.open(3), 0u);
-    EXPECT_EQ(device.close(3), 0u);
-    EXPECT_EQ(inner->counts().lastOpenOptions, 3u);
-    EXPECT_EQ(inner->counts().close, 1);
-}
-
 }  // namespace
 }  // namespace TolkaTouch

@@ -5,11 +5,14 @@
 # them, the scenario scripts and an /init that runs them.
 #
 # usage: build-initramfs.sh --out FILE --kernel-version VERSION [--busybox PATH]
-#            [--program PATH]... [--library PATH]... [--file SRC:DEST]... [--dir SRC:DEST]...
+#            [--program PATH]... [--library PATH]... [--tree DIR]... [--file SRC:DEST]... [--dir SRC:DEST]...
 #   --program  an executable; copied at its own path (so build-tree RUNPATHs keep working),
 #              linked into /usr/bin, and its libraries with it
 #   --library  a shared object loaded at run time (a plug-in); copied at its own path, with its
 #              libraries
+#   --tree     a file system tree (an unpacked package) copied at the image's root, so its
+#              programs run from the paths they are installed at, with the libraries they need
+#              from outside the tree
 #   --file, --dir  copied into the image at DEST
 # Exit status 77: something needed is not installed on this machine (the reason is printed).
 set -euo pipefail
@@ -19,6 +22,7 @@ kver=""
 busybox=/bin/busybox
 programs=()
 libraries=()
+trees=()
 files=()
 dirs=()
 modules=(hid uhid hid-generic uinput evdev)
@@ -30,6 +34,7 @@ while [ $# -gt 0 ]; do
         --busybox) busybox="$2"; shift 2 ;;
         --program) programs+=("$2"); shift 2 ;;
         --library) libraries+=("$2"); shift 2 ;;
+        --tree) trees+=("$2"); shift 2 ;;
         --file) files+=("$2"); shift 2 ;;
         --dir) dirs+=("$2"); shift 2 ;;
         *) echo "build-initramfs: unknown argument $1" >&2; exit 2 ;;
@@ -66,9 +71,10 @@ copy_at_own_path() {
     cp -L "$path" "$root$path"
 }
 
-# Copy the shared libraries ldd resolves for an ELF file, and the dynamic loader.
+# Copy the shared libraries ldd resolves for an ELF file, and the dynamic loader; those inside
+# `inside` (a tree copied whole) are there already.
 copy_libraries() {
-    local elf="$1" line lib
+    local elf="$1" inside="${2:-}" line lib
     if ! ldd "$elf" >/dev/null 2>&1; then return 0; fi  # static
     if ldd "$elf" | grep -q 'not found'; then
         echo "build-initramfs: $elf needs a library ldd cannot find:" >&2
@@ -82,6 +88,7 @@ copy_libraries() {
             /*) lib=${line%% (*} ;;
         esac
         [ -n "$lib" ] || continue
+        if [ -n "$inside" ]; then case "$lib" in "$inside"/*) continue ;; esac; fi
         copy_at_own_path "$lib"
         case "$lib" in /lib/* | /lib64/* | /usr/*) ;; *) strip_copy "$lib" ;; esac
     done < <(ldd "$elf")
@@ -104,6 +111,16 @@ for library in "${libraries[@]}"; do
     copy_at_own_path "$library"
     strip_copy "$library"
     copy_libraries "$library"
+done
+
+for tree in "${trees[@]}"; do
+    tree=$(realpath "$tree")
+    cp -a "$tree/." "$root/"
+    while IFS= read -r -d '' file; do
+        [ "$(head -c 4 "$file" | od -An -c | tr -d ' ')" = '177ELF' ] || continue
+        strip_copy "${file#"$tree"}"
+        copy_libraries "$file" "$tree"
+    done < <(find "$tree" -type f -print0)
 done
 
 # systemd-udevd: the same program as udevadm on some systems, chosen by the name it runs under.

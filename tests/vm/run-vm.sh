@@ -5,8 +5,11 @@
 # finish; 77 this machine cannot run the tier (the reason is printed; the tier is then skipped,
 # never passed).
 #
-# usage: run-vm.sh --work-dir DIR --tolkatouch PATH --daemon PATH --plugin PATH --check PATH
-#                  [--examples DIR] [--kernel-version VERSION] [--timeout SECONDS]
+# usage: run-vm.sh --work-dir DIR (--package DEB | --tolkatouch PATH --daemon PATH --plugin PATH)
+#                  --check PATH [--examples DIR] [--kernel-version VERSION] [--timeout SECONDS]
+#   --package  the tolkatouch Debian package: unpacked at the machine's root, so the daemon runs
+#              from the unit's paths and finds its plug-in beside itself, as installed
+#   --tolkatouch, --daemon, --plugin  the build tree's programs, run from where they were built
 # Environment: TOLKA_VM_QEMU (the emulator, default qemu-system-x86_64), TOLKA_VM_KERNEL_VERSION,
 # TOLKA_VM_TIMEOUT (seconds for the whole machine, default 220), TOLKA_VM_SCENARIO_TIMEOUT (90).
 set -uo pipefail
@@ -16,6 +19,7 @@ work=""
 tolkatouch=""
 daemon=""
 plugin=""
+package=""
 check=""
 examples=""
 kver="${TOLKA_VM_KERNEL_VERSION:-}"
@@ -28,6 +32,7 @@ while [ $# -gt 0 ]; do
         --tolkatouch) tolkatouch="$2"; shift 2 ;;
         --daemon) daemon="$2"; shift 2 ;;
         --plugin) plugin="$2"; shift 2 ;;
+        --package) package="$2"; shift 2 ;;
         --check) check="$2"; shift 2 ;;
         --examples) examples="$2"; shift 2 ;;
         --kernel-version) kver="$2"; shift 2 ;;
@@ -35,6 +40,15 @@ while [ $# -gt 0 ]; do
         *) echo "run-vm: unknown argument $1" >&2; exit 2 ;;
     esac
 done
+if [ -n "$package" ]; then
+    [ -f "$package" ] || { echo "run-vm: no package $package" >&2; exit 1; }
+    mkdir -p "$work"
+    rm -rf "$work/package"
+    dpkg-deb -x "$package" "$work/package" || { echo "run-vm: cannot unpack $package" >&2; exit 1; }
+    tolkatouch=$work/package/usr/bin/tolkatouch
+    daemon=$work/package/usr/sbin/tolkatouchd
+    plugin=$(find "$work/package/usr/lib" -path '*/tolkatouch/*hidservice*.so' | head -1)
+fi
 for required in work tolkatouch daemon plugin check; do
     [ -n "${!required}" ] || { echo "run-vm: --${required/_/-} is required" >&2; exit 2; }
 done
@@ -77,14 +91,20 @@ else
     cp "$work/docs/everyday-fallback.json" "$work/docs/everyday.json"
 fi
 
+# From the package the daemon finds its plug-in itself; from the build tree it is told where.
 cat > "$work/vm.env" <<EOF
-TOLKA_PLUGIN=$(realpath "$plugin")
+TOLKA_PLUGIN=$([ -n "$package" ] || realpath "$plugin")
 SCENARIO_TIMEOUT=${TOLKA_VM_SCENARIO_TIMEOUT:-90}
 EOF
 
 # ---- the initramfs ----
+if [ -n "$package" ]; then
+    service=(--tree "$work/package")
+else
+    service=(--program "$tolkatouch" --program "$daemon" --library "$plugin")
+fi
 "$here/build-initramfs.sh" --out "$work/initramfs.cpio" --kernel-version "$kver" \
-    --program "$tolkatouch" --program "$daemon" --program "$check" --library "$plugin" \
+    "${service[@]}" --program "$check" \
     --file "$here/init.sh:/init" --file "$work/vm.env:/etc/vm.env" \
     --dir "$here/scenarios:/scenarios" --dir "$work/docs:/docs"
 status=$?

@@ -45,7 +45,7 @@ keyboard_present() { grep -q "N: Name=\"$KEYBOARD_NAME\"" /proc/bus/input/device
 # start_daemon: tolkatouchd in the background, its events (--print) in $WORK/events.jsonl and its
 # log in $WORK/daemon.log; waits until it has its keyboard and its control socket.
 start_daemon() {
-    tolkatouchd --plugin "$TOLKA_PLUGIN" --print "$@" > "$WORK/events.jsonl" 2> "$WORK/daemon.log" &
+    tolkatouchd ${TOLKA_PLUGIN:+--plugin "$TOLKA_PLUGIN"} --print "$@" > "$WORK/events.jsonl" 2> "$WORK/daemon.log" &
     DAEMON_PID=$!
     wait_until 20 daemon_ready || { daemon_log; fail "the daemon made no keyboard"; }
     wait_until 20 test -S /run/tolkatouch/tolkatouchd.sock || { daemon_log; fail "no control socket"; }

@@ -5,11 +5,12 @@
 #include <string>
 #include <string_view>
 
-namespace TolkaTouch::Tools {
+namespace TolkaTouch {
 
 inline std::string printableText(std::string_view text) {
     static constexpr char kDigits[] = "0123456789abcdef";
     std::string out;
+    out.reserve(text.size());
     for (const char c : text) {
         const auto byte = static_cast<unsigned char>(c);
         if (byte < 0x20 || byte == 0x7f) {
@@ -23,4 +24,4 @@ inline std::string printableText(std::string_view text) {
     return out;
 }
 
-}  // namespace TolkaTouch::Tools
+}  // namespace TolkaTouch
