@@ -66,12 +66,16 @@ for way in INT TERM duration; do
   exec 3<>"$work/fifo"
   cat "$work/reports.bin" >&3
   if [ "$way" = duration ]; then
-    record --device "$work/fifo" --duration 1 -o "$work/$way.jsonl"
+    record --device "$work/fifo" --duration 2 -o "$work/$way.jsonl"
     status=$?
   else
     "$tool" record --socket "$work/no-service.sock" --device "$work/fifo" -o "$work/$way.jsonl" 2>"$work/$way.err" &
     pid=$!
-    sleep 1.5
+    # The signal once every report is on disk (flushed within a second), however loaded the machine.
+    for _ in $(seq 100); do
+      [ "$(grep -c '"InputReport"' "$work/$way.jsonl" 2>/dev/null)" = "$reports" ] && break
+      sleep 0.1
+    done
     kill -"$way" "$pid"
     wait "$pid"
     status=$?
