@@ -56,7 +56,12 @@ pids+=("$daemon_pid")
 ) > "$work/rss.txt" &
 pids+=($!)
 
-for _ in $(seq 500); do [ -S "$socket" ] && break; sleep 0.01; done
+# A long document takes the daemon a while to open on a busy machine: wait for its socket as long
+# as it runs.
+while [ ! -S "$socket" ]; do
+  kill -0 "$daemon_pid" 2>/dev/null || { echo "FAIL: the daemon ended before it served"; cat "$work/daemon.err"; exit 1; }
+  sleep 0.1
+done
 setting=Pipeline.Algs.EnableTapSuppression
 value=$("$tolkatouch" prop get "$setting" --socket "$socket")
 
