@@ -64,6 +64,8 @@ public:
     // `eventJson` is one JSON object on one line (the form replay --json prints).
     void writeEvent(uint64_t timestamp, std::string_view eventJson);
     void flush();
+    // Bytes written but still in the buffer, not yet given to the sink.
+    size_t bufferedBytes() const { return _buffer.size(); }
 
 private:
     void endLine();

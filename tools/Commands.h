@@ -26,5 +26,7 @@ void addEvalCommand(CLI::App& app);
 void addSweepCommand(CLI::App& app);
 void addPlotCommand(CLI::App& app);
 void addTuneCommand(CLI::App& app);
+void addPlotEvalCommand(CLI::App& app);
+void addRecordCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

@@ -11,6 +11,7 @@
 #include "tools/Commands.h"
 #include "tools/ControlClient.h"
 #include "tools/DocumentFile.h"
+#include "tools/HexId.h"
 #include "tools/UdevSurfaces.h"
 
 namespace TolkaTouch::Tools {
@@ -23,14 +24,6 @@ struct DevicesArguments {
     std::string vendor = "1209";
     std::string product = "0001";
 };
-
-uint16_t hexId(const std::string& text, const char* what) {
-    std::string digits = text.rfind("0x", 0) == 0 || text.rfind("0X", 0) == 0 ? text.substr(2) : text;
-    if (digits.empty() || digits.size() > 4 || digits.find_first_not_of("0123456789abcdefABCDEF") != std::string::npos) {
-        throw CLI::ValidationError(what, "expected a hexadecimal ID of at most four digits, got \"" + text + "\"");
-    }
-    return static_cast<uint16_t>(std::stoul(digits, nullptr, 16));
-}
 
 // No daemon answers: the surfaces udev knows of, and a line on standard error that says so.
 void listFromUdev(const DevicesArguments& arguments, const std::string& why) {

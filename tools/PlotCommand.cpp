@@ -1,6 +1,5 @@
-// tolkatouch plot: draws a recording with the tolkatouch Python package (python3 -m
-// tolkatouch.plot). The package is looked for beside the program in the build tree
-// (<build>/tools/tolkatouch and <build>/python/tolkatouch), then in the system's Python path.
+// tolkatouch plot and plot-eval: draw a recording, or evaluations, with the tolkatouch Python
+// package (python3 -m tolkatouch.plot, tolkatouch.plot_eval), found as execPythonModule finds it.
 
 #include <memory>
 #include <optional>
@@ -24,12 +23,32 @@ struct PlotArguments {
     std::vector<std::string> settings;
 };
 
+struct PlotEvalArguments {
+    std::string results;
+    std::string output;
+    std::string kind;
+    std::string setting;
+    std::string metric;
+    std::optional<int> point;
+};
+
+}
+
 [[noreturn]] void runPlot(const PlotArguments& arguments) {
     std::vector<std::string> words{arguments.document, "-o", arguments.output};
     if (arguments.from) words.insert(words.end(), {"--from", std::to_string(*arguments.from)});
     if (arguments.to) words.insert(words.end(), {"--to", std::to_string(*arguments.to)});
     for (const std::string& setting : arguments.settings) words.insert(words.end(), {"--set", setting});
     execPythonModule("plot", words, "TOLKATOUCH_PLOT_PROG", "tolkatouch plot");
+}
+
+[[noreturn]] void runPlotEval(const PlotEvalArguments& arguments) {
+    std::vector<std::string> words{arguments.results, "-o", arguments.output};
+    if (!arguments.kind.empty()) words.insert(words.end(), {"--kind", arguments.kind});
+    if (!arguments.setting.empty()) words.insert(words.end(), {"--setting", arguments.setting});
+    if (!arguments.metric.empty()) words.insert(words.end(), {"--metric", arguments.metric});
+    if (arguments.point) words.insert(words.end(), {"--point", std::to_string(*arguments.point)});
+    execPythonModule("plot_eval", words, "TOLKATOUCH_PLOT_PROG", "tolkatouch plot-eval");
 }
 
 }  // namespace
@@ -53,6 +72,28 @@ void addPlotCommand(CLI::App& app) {
         ->allow_extra_args(false)
         ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
     command->callback([arguments] { runPlot(*arguments); });
+}
+
+void addPlotEvalCommand(CLI::App& app) {
+    auto arguments = std::make_shared<PlotEvalArguments>();
+    CLI::App* command = app.add_subcommand(
+        "plot-eval",
+        "Draw evaluations (what eval --json, sweep --json or tolkatouch.evaluate writes): the confusion matrix, a metric "
+        "against a setting with one line per gesture kind, or a DET-style curve of false rejects against false "
+        "activations per hour (needs the tolkatouch Python package).");
+    command->add_option("RESULTS", arguments->results, "JSON results to draw")->required();
+    command->add_option("-o,--output", arguments->output, "Image to write: .png, .svg or .pdf")
+        ->required()
+        ->type_name("IMAGE");
+    command->add_option("--kind", arguments->kind, "What to draw: confusion (default), metric or det")
+        ->check(CLI::IsMember({"confusion", "metric", "det"}));
+    command->add_option("--setting", arguments->setting, "The setting on the x axis (default: the first that varies)")
+        ->type_name("KEY");
+    command->add_option("--metric", arguments->metric, "For --kind metric: F1 (default), Precision or Recall")
+        ->check(CLI::IsMember({"F1", "Precision", "Recall"}));
+    command->add_option("--point", arguments->point, "The point whose confusion matrix to draw (default 0, a sweep's best)")
+        ->type_name("N");
+    command->callback([arguments] { runPlotEval(*arguments); });
 }
 
 }  // namespace TolkaTouch::Tools

@@ -49,6 +49,8 @@ int main(int argc, char** argv) {
     addSweepCommand(app);
     addPlotCommand(app);
     addTuneCommand(app);
+    addPlotEvalCommand(app);
+    addRecordCommand(app);
 
     // A first word that names no subcommand is a typo far more often than anything else.
     if (argc > 1 && argv[1][0] != '-') {

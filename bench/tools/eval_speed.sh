@@ -30,8 +30,8 @@ read -r eval1_wall eval1_cpu < <(timed "$tool" eval -j 1 "$corpus")
 replay_all() { for doc in "$corpus"/*.json; do [[ "$doc" == *.labels.json ]] || "$tool" replay --fast "$doc"; done; }
 read -r replay_wall replay_cpu < <(timed replay_all)
 
-noise=("$corpus"/noise-only-*.json)
-noise=("${noise[@]/*.labels.json/}")
+noise=()
+for doc in "$corpus"/noise-only-*.json; do [[ "$doc" == *.labels.json ]] || noise+=("$doc"); done
 noise_frames=$("$tool" eval --json -j 1 "${noise[@]}" | grep -o '"Frames":[0-9]*' | head -1 | cut -d: -f2)
 read -r _ noise_eval_cpu < <(timed "$tool" eval -j 1 "${noise[@]}")
 replay_noise() { for doc in "${noise[@]}"; do "$tool" replay --fast "$doc"; done; }

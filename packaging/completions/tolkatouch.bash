@@ -3,7 +3,7 @@
 _tolkatouch() {
     local cur prev words cword
     _init_completion || return
-    local subcommands="replay synth show convert eval sweep plot tune uhid keys prop devices log watch"
+    local subcommands="replay synth show convert eval sweep plot plot-eval tune record uhid keys prop devices log watch"
     if [[ $cword -eq 1 ]]; then
         COMPREPLY=($(compgen -W "$subcommands --help --version" -- "$cur"))
         return
@@ -18,6 +18,8 @@ _tolkatouch() {
         sweep) options="--list --jobs --tolerance --set --settings --grid --metric --json --csv --help" ;;
         plot) options="--output --from --to --set --help" ;;
         tune) options="--trials --timeout --space --objective --max-false-activations-per-hour --pareto --heldout --seed --sampler --pruner --storage --study --jobs --tolerance --write-settings --plots --json --help" ;;
+        plot-eval) options="--output --kind --setting --metric --point --help" ;;
+        record) options="--output --device --vendor --product --duration --max-reports --rotate --with-events --socket --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)
@@ -40,7 +42,9 @@ _tolkatouch() {
         watch) options="--json --socket --help" ;;
     esac
     case $prev in
-        -o|--output|--socket|--uhid|--list|--labels) _filedir; return ;;
+        -o|--output|--socket|--uhid|--list|--labels|--device) _filedir; return ;;
+        --kind) COMPREPLY=($(compgen -W "confusion metric det" -- "$cur")); return ;;
+        --metric) [[ ${words[1]} == plot-eval ]] && { COMPREPLY=($(compgen -W "F1 Precision Recall" -- "$cur")); return; } ;;
         --finger) COMPREPLY=($(compgen -W "light normal heavy" -- "$cur")); return ;;
         --to) COMPREPLY=($(compgen -W "document lines" -- "$cur")); return ;;
     esac

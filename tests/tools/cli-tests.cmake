@@ -195,3 +195,11 @@ tolka_add_cli_test(SweepOfAnUnknownSettingNamesIt --exit 2 --stdout-empty --stde
 foreach(command eval sweep)
   tolka_add_cli_test(HelpOf-${command}-Succeeds --stderr-empty -- ${command} --help)
 endforeach()
+
+# record.
+add_test(NAME RecordEndsWithAWholeRecordingHoweverItStops
+         COMMAND bash ${CMAKE_CURRENT_SOURCE_DIR}/record_check.sh $<TARGET_FILE:tolkatouch> ${CMAKE_CURRENT_BINARY_DIR}/record-check)
+set_tests_properties(RecordEndsWithAWholeRecordingHoweverItStops PROPERTIES LABELS cli TIMEOUT 120)
+tolka_add_cli_test(RecordWithABadRotationPrintsTheUsage --exit 2 --stdout-empty --stderr-contains "expected a size (100M, 512K) or a duration (30s, 10min, 1h)"
+  -- record --device /dev/null --rotate 10parsecs -o ${CMAKE_CURRENT_BINARY_DIR}/bad-rotation.jsonl)
+tolka_add_cli_test(HelpOf-record-Succeeds --stderr-empty -- record --help)

@@ -167,7 +167,9 @@ CorpusListing listCorpus(const std::vector<std::string>& paths) {
             for (auto it = fs::recursive_directory_iterator(path, error); !error && it != fs::recursive_directory_iterator();
                  it.increment(error)) {
                 const std::string name = it->path().string();
-                if (it->is_regular_file() && name.ends_with(".json") && !isLabelsPath(name)) found.push_back(name);
+                if (it->is_regular_file() && (name.ends_with(".json") || name.ends_with(".jsonl")) && !isLabelsPath(name)) {
+                    found.push_back(name);
+                }
             }
             if (error) listing.failures.push_back(FileFailure{path, error.message()});
             std::sort(found.begin(), found.end());

@@ -105,6 +105,8 @@ std::string labelsDocument(const std::vector<Label>& labels) {
 
 std::string labelsPathFor(const std::string& documentPath) {
     if (documentPath.ends_with(".json")) return documentPath.substr(0, documentPath.size() - 5) + ".labels.json";
+    // What `tolkatouch record` writes: the line form.
+    if (documentPath.ends_with(".jsonl")) return documentPath.substr(0, documentPath.size() - 6) + ".labels.json";
     return documentPath + ".labels.json";
 }
 

@@ -50,7 +50,7 @@ std::vector<Label> parseLabels(std::string_view text);
 // The document form, one label per line, times in whole milliseconds rounded to the nearest.
 std::string labelsDocument(const std::vector<Label>& labels);
 
-// "DOC.labels.json" for "DOC.json" (or for any other name, the name plus ".labels.json").
+// "DOC.labels.json" for "DOC.json" and "DOC.jsonl" (for any other name, the name plus ".labels.json").
 std::string labelsPathFor(const std::string& documentPath);
 bool isLabelsPath(std::string_view path);
 

@@ -135,6 +135,18 @@ TEST_F(EvaluationTest, FolderListsItsDocumentsSortedWithoutLabelsFiles) {
     EXPECT_EQ(listing.failures[0].reason, "no such file or folder");
 }
 
+TEST_F(EvaluationTest, FolderListsLineFormRecordingsBesideDocuments) {
+    const auto recorded = _folder / "recorded.0001.jsonl";
+    writeText(recorded.string(), "{\"Version\":1,\"Format\":\"lines\"}\n");
+    writeText((_folder / "notes.txt").string(), "not a recording\n");
+    std::vector<std::string> expected = _documents;
+    expected.push_back(recorded.string());
+    std::sort(expected.begin(), expected.end());
+    EXPECT_EQ(listCorpus({_folder.string()}).documents, expected);
+    std::filesystem::remove(recorded);
+    std::filesystem::remove(_folder / "notes.txt");
+}
+
 TEST_F(EvaluationTest, LoadedCorpusGivesWhatFilesGive) {
     EvaluationOptions options;
     options.jobs = 2;

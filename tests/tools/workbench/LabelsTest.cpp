@@ -75,6 +75,7 @@ TEST(LabelsTest, NamesTheLabelAndWhatIsWrong) {
 
 TEST(LabelsTest, LabelsLiveBesideTheirDocument) {
     EXPECT_EQ(labelsPathFor("corpus/taps-1.json"), "corpus/taps-1.labels.json");
+    EXPECT_EQ(labelsPathFor("recorded/session.0002.jsonl"), "recorded/session.0002.labels.json");
     EXPECT_EQ(labelsPathFor("session.rec"), "session.rec.labels.json");
     EXPECT_TRUE(isLabelsPath("corpus/taps-1.labels.json"));
     EXPECT_FALSE(isLabelsPath("corpus/taps-1.json"));
