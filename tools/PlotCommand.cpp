@@ -32,8 +32,6 @@ struct PlotEvalArguments {
     std::optional<int> point;
 };
 
-}
-
 [[noreturn]] void runPlot(const PlotArguments& arguments) {
     std::vector<std::string> words{arguments.document, "-o", arguments.output};
     if (arguments.from) words.insert(words.end(), {"--from", std::to_string(*arguments.from)});
