@@ -25,5 +25,6 @@ void addWatchCommand(CLI::App& app);
 void addEvalCommand(CLI::App& app);
 void addSweepCommand(CLI::App& app);
 void addPlotCommand(CLI::App& app);
+void addViewCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

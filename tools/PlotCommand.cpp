@@ -1,13 +1,6 @@
 // tolkatouch plot: draws a recording with the tolkatouch Python package (python3 -m
-// tolkatouch.plot). The package is looked for beside the program in the build tree
-// (<build>/tools/tolkatouch and <build>/python/tolkatouch), then in the system's Python path.
+// tolkatouch.plot; PythonModule.h says where the package is looked for).
 
-#include <unistd.h>
-
-#include <cerrno>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
 #include <memory>
 #include <optional>
 #include <string>
@@ -16,14 +9,11 @@
 #include <CLI/CLI.hpp>
 
 #include "tools/Commands.h"
-#include "tools/DocumentFile.h"
+#include "tools/PythonModule.h"
 
 namespace TolkaTouch::Tools {
 
 namespace {
-
-// The interpreter the package is built for: Debian's, which has numpy and matplotlib.
-constexpr const char* kPython = "/usr/bin/python3";
 
 struct PlotArguments {
     std::string document;
@@ -33,35 +23,12 @@ struct PlotArguments {
     std::vector<std::string> settings;
 };
 
-// <build>/python when this program runs from a build tree that built the package.
-std::optional<std::filesystem::path> buildTreePackageDirectory() {
-    std::error_code error;
-    const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", error);
-    if (error) return std::nullopt;
-    const std::filesystem::path directory = self.parent_path().parent_path() / "python";
-    if (!std::filesystem::exists(directory / "tolkatouch" / "plot.py", error)) return std::nullopt;
-    return directory;
-}
-
 [[noreturn]] void runPlot(const PlotArguments& arguments) {
-    if (const auto directory = buildTreePackageDirectory()) {
-        std::string path = directory->string();
-        if (const char* existing = std::getenv("PYTHONPATH"); existing && *existing) path += std::string(":") + existing;
-        ::setenv("PYTHONPATH", path.c_str(), 1);
-    }
-    ::setenv("TOLKATOUCH_PLOT_PROG", "tolkatouch plot", 1);
-
-    std::vector<std::string> words{kPython, "-m", "tolkatouch.plot", arguments.document, "-o", arguments.output};
+    std::vector<std::string> words{arguments.document, "-o", arguments.output};
     if (arguments.from) words.insert(words.end(), {"--from", std::to_string(*arguments.from)});
     if (arguments.to) words.insert(words.end(), {"--to", std::to_string(*arguments.to)});
     for (const std::string& setting : arguments.settings) words.insert(words.end(), {"--set", setting});
-    std::vector<char*> argv;
-    for (std::string& word : words) argv.push_back(word.data());
-    argv.push_back(nullptr);
-
-    std::fflush(stdout);
-    ::execv(kPython, argv.data());
-    throw ToolError(kPython, std::strerror(errno));
+    execPythonModule("tolkatouch.plot", words, "TOLKATOUCH_PLOT_PROG", "tolkatouch plot");
 }
 
 }  // namespace

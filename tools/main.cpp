@@ -48,6 +48,7 @@ int main(int argc, char** argv) {
     addEvalCommand(app);
     addSweepCommand(app);
     addPlotCommand(app);
+    addViewCommand(app);
 
     // A first word that names no subcommand is a typo far more often than anything else.
     if (argc > 1 && argv[1][0] != '-') {

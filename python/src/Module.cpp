@@ -8,6 +8,7 @@
 #include "RecordingBinding.h"
 #include "ReplayBinding.h"
 #include "SynthBinding.h"
+#include "ViewBinding.h"
 
 PYBIND11_MODULE(_tolkatouch, module) {
     module.doc() = "The C++ side of the tolkatouch package; use the names tolkatouch exports.";
@@ -16,4 +17,5 @@ PYBIND11_MODULE(_tolkatouch, module) {
     TolkaTouch::Python::addReplay(module);
     TolkaTouch::Python::addSynth(module);
     TolkaTouch::Python::addEvaluate(module);
+    TolkaTouch::Python::addView(module);
 }
