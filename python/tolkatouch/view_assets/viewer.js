@@ -386,6 +386,7 @@
     box.dataset.changed = whatIf.changed;
     box.dataset.added = whatIf.added;
     box.dataset.lost = whatIf.lost;
+    box.dataset.events = JSON.stringify(whatIf.events.map(e => [e.frame, e.kind, e.region]));
     if (whatIf.summary_before && whatIf.summary_after) box.appendChild(metricsTable(whatIf.summary_before, whatIf.summary_after));
     box.appendChild(eventList("changed", whatIf.changed_events));
     box.appendChild(eventList("added", whatIf.added_events));
