@@ -3,7 +3,7 @@
 _tolkatouch() {
     local cur prev words cword
     _init_completion || return
-    local subcommands="replay synth show convert eval sweep plot uhid keys prop devices log watch"
+    local subcommands="replay synth show convert eval sweep plot view uhid keys prop devices log watch"
     if [[ $cword -eq 1 ]]; then
         COMPREPLY=($(compgen -W "$subcommands --help --version" -- "$cur"))
         return
@@ -17,6 +17,7 @@ _tolkatouch() {
         eval) options="--list --jobs --tolerance --set --json --shard --merge --help" ;;
         sweep) options="--list --jobs --tolerance --set --grid --metric --json --csv --help" ;;
         plot) options="--output --from --to --set --help" ;;
+        view) options="--labels --set --port --no-browser --export --from --to --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)

@@ -133,12 +133,13 @@
       line: {color: "#e91e63", width: 1.5}});
     const layout = {
       margin: {l: 90, r: 60, t: 10, b: 35}, uirevision: "timeline", hovermode: "closest", shapes: shapes,
-      legend: {orientation: "h", x: 0.5, y: 0.345, xanchor: "center", yanchor: "bottom", font: {size: 10}, bgcolor: "rgba(0,0,0,0)"},
+      legend: {orientation: "h", x: 0.5, y: 0.375, xanchor: "center", yanchor: "bottom", font: {size: 10}, bgcolor: "rgba(0,0,0,0)"},
       xaxis: {anchor: "y4", range: [state.from, state.to], title: {text: "seconds since the first frame", standoff: 4}},
-      yaxis: {domain: [0.57, 1], autorange: "reversed", type: "category", title: {text: "reading"}, fixedrange: true},
-      yaxis2: {domain: [0.40, 0.555], autorange: "reversed", type: "category", showticklabels: false, title: {text: "on"}, fixedrange: true},
-      yaxis3: {domain: [0.15, 0.34], range: [-115, 115], title: {text: "score"}, fixedrange: true},
-      yaxis4: {domain: [0, 0.13], range: [-0.5, 4.5], tickvals: [0, 1, 2, 3, 4], ticktext: BAND_ROWS, fixedrange: true},
+      yaxis: {domain: [0.58, 1], autorange: "reversed", type: "category", dtick: 1, tickfont: {size: 9},
+        title: {text: "reading by zone"}, fixedrange: true},
+      yaxis2: {domain: [0.42, 0.565], autorange: "reversed", type: "category", showticklabels: false, title: {text: "on"}, fixedrange: true},
+      yaxis3: {domain: [0.20, 0.37], range: [-115, 115], title: {text: "score"}, fixedrange: true},
+      yaxis4: {domain: [0, 0.18], range: [-0.5, 4.5], tickvals: [0, 1, 2, 3, 4], ticktext: BAND_ROWS, tickfont: {size: 9}, fixedrange: true},
     };
     return {traces, layout};
   }
