@@ -5,6 +5,7 @@ time range, every number of one frame, and what a settings change would have don
 from __future__ import annotations
 
 import os
+import threading
 from collections import OrderedDict
 from typing import List, Optional, Sequence
 
@@ -20,7 +21,11 @@ HEAT_ROWS = [PIXEL_NAMES.index(letter) for region in ZONE_ORDER for letter in ZO
 #: Frame verdicts (TRANSITION_NAMES order) that mean a hold is on.
 HOLD_TRANSITIONS = (3, 4, 5, 6)
 #: At most this many columns per series: a range of more frames is sent as min/max per column.
-MAX_COLUMNS = 1500
+MAX_COLUMNS = 1000
+#: At most this many events are sent one by one; a range with more sends their count per column.
+MAX_EVENTS = 400
+#: The what-if answer lists at most this many changed, added and lost events each (all are counted).
+MAX_LISTED = 200
 #: Replays kept for settings points the page asked about, besides the baseline.
 CACHED_REPLAYS = 4
 #: The eval tolerance, as `tolkatouch eval` takes it by default.
@@ -89,18 +94,38 @@ class ViewData:
     """One recording, its labels and the settings it was opened with, and replays of it under
     other settings, kept for the page's questions."""
 
-    def __init__(self, recording: Recording, name: str, settings: Sequence[str] = ()):
+    def __init__(self, recording: Recording, name: str, settings: Sequence[str] = (), replay_now: bool = True):
         self.recording = recording
         self.name = name
         self.settings = setting_assignments(settings)
         _core.check_settings(self.settings)
-        self.baseline = replay(recording, self.settings)
-        self.seconds = self.baseline.frames.seconds
         self._replays: "OrderedDict[tuple, Replay]" = OrderedDict()
         self._evaluations: dict = {}
+        self._ready = threading.Event()
+        self._failure: Optional[BaseException] = None
+        if replay_now:
+            self.prepare()
+
+    def prepare(self) -> None:
+        """Replays the recording under the opening settings; the page's questions wait for it, so
+        a server may answer its first requests (the page's scripts) meanwhile."""
+        try:
+            self.baseline = replay(self.recording, self.settings)
+            self.seconds = self.baseline.frames.seconds
+        except BaseException as error:  # noqa: BLE001 - handed to every question instead
+            self._failure = error
+            raise
+        finally:
+            self._ready.set()
+
+    def wait_ready(self) -> None:
+        """Waits for the opening replay; raises what it raised, if it failed."""
+        self._ready.wait()
+        if self._failure is not None:
+            raise RuntimeError(f"the replay failed: {self._failure}")
 
     @classmethod
-    def open(cls, path: str, labels: Optional[str] = None, settings: Sequence[str] = ()) -> "ViewData":
+    def open(cls, path: str, labels: Optional[str] = None, settings: Sequence[str] = (), replay_now: bool = True) -> "ViewData":
         """Reads the recording (OSError, DocumentError) and its labels: the file given, else the
         DOC.labels.json beside it."""
         recording = Recording.load(path)
@@ -108,7 +133,7 @@ class ViewData:
             with open(labels, encoding="utf-8") as file:
                 text = file.read()
             _core.attach_labels(recording, text, labels)
-        return cls(recording, os.path.basename(path), settings)
+        return cls(recording, os.path.basename(path), settings, replay_now)
 
     # Settings -----------------------------------------------------------------------------
     def replay_for(self, settings: Sequence[str]) -> Replay:
@@ -157,7 +182,7 @@ class ViewData:
             "has_labels": self.recording.labels is not None,
             "labels": [{"kind": l.kind, "zone": l.zone, "to_zone": l.to_zone, "start": l.start_us / 1e6,
                         "end": l.end_us / 1e6} for l in labels],
-            "events": event_rows(self.baseline),
+            "event_count": len(self.baseline.events),
             "evaluation": evaluation_summary(self.evaluation(self.settings)),
         }
 
@@ -176,11 +201,11 @@ class ViewData:
         first = int(np.searchsorted(self.seconds, start, side="left"))
         last = int(np.searchsorted(self.seconds, end, side="right"))
         count = max(last - first, 0)
-        out = {"start": start, "end": end, "first": first, "count": count, "heat_rows": [PIXEL_NAMES[i] for i in HEAT_ROWS],
-               "events": event_rows(result, start, end)}
+        out = {"start": start, "end": end, "first": first, "count": count, "heat_rows": [PIXEL_NAMES[i] for i in HEAT_ROWS]}
         if count == 0:
             out.update(bucketed=False, x=[], heat=[[] for _ in HEAT_ROWS], on=[[] for _ in HEAT_ROWS], score_min=[],
                        score_max=[], svm=[], hand=[], region=[])
+            self._add_events(out, result, start, end)
             return out
         span = slice(first, last)
         readings = frames.readings[span][:, HEAT_ROWS]
@@ -193,6 +218,7 @@ class ViewData:
             out.update(bucketed=False, x=_round(self.seconds[span], 4), heat=readings.T.tolist(),
                        on=on.T.astype(np.uint8).tolist(), score_min=_round(score), score_max=_round(score),
                        svm=_round(svm), hand=hand.tolist(), region=region.tolist())
+            self._add_events(out, result, start, end)
             return out
         edges = np.linspace(0, count, columns + 1).astype(np.int64)[:-1]
         sizes = np.diff(np.append(edges, count))
@@ -206,8 +232,25 @@ class ViewData:
             svm=_round(np.maximum.reduceat(svm, edges)),
             hand=np.maximum.reduceat(hand, edges).tolist(),
             region=np.maximum.reduceat(region, edges).tolist())
+        self._add_events(out, result, start, end)
         return out
 
+    def _add_events(self, out: dict, result: Replay, start: float, end: float) -> None:
+        """The range's events one by one, or, past MAX_EVENTS, their count in each column; the
+        opening settings' events beside them when the series are another replay's."""
+        x = out["x"]
+        for name, source in (("events", result), ("opening_events", self.baseline)):
+            if name == "opening_events" and source is result:
+                continue
+            seconds = source.events["seconds"]
+            inside = (seconds >= start) & (seconds <= end)
+            count = int(inside.sum())
+            if count <= MAX_EVENTS or not x:
+                out[name] = event_rows(source, start, end)
+            else:
+                columns = np.searchsorted(np.asarray(x), seconds[inside], side="right") - 1
+                out[name] = []
+                out[name + "_per_column"] = np.bincount(np.clip(columns, 0, len(x) - 1), minlength=len(x)).tolist()
     def frame_at(self, seconds: float) -> int:
         """The frame nearest to a time in seconds from the first frame."""
         if len(self.seconds) == 0:
@@ -216,6 +259,18 @@ class ViewData:
         if index >= len(self.seconds) or (index > 0 and seconds - self.seconds[index - 1] < self.seconds[index] - seconds):
             index -= 1
         return max(index, 0)
+
+    def event_frame(self, settings: Sequence[str], index: int, direction: int) -> int:
+        """The frame of the first event after frame `index` (direction 1) or the last before it
+        (-1), under the settings; `index` itself when there is none."""
+        events = self.replay_for(settings).events
+        seconds = events["seconds"][events["frame"] >= 0]
+        now = self.seconds[min(max(index, 0), len(self.seconds) - 1)]
+        if direction > 0:
+            later = seconds[seconds > now]
+            return self.frame_at(float(later[0])) if len(later) else index
+        earlier = seconds[seconds < now]
+        return self.frame_at(float(earlier[-1])) if len(earlier) else index
 
     def frame(self, settings: Sequence[str], index: int) -> dict:
         """Every number of frame `index`'s snapshot under the settings (IndexError outside)."""
@@ -243,7 +298,9 @@ class ViewData:
         before = event_rows(self.baseline)
         after = event_rows(result)
         comparison = compare_events(before, after)
-        return {"settings": list(settings), "events": after, **comparison,
+        for name in ("changed_events", "added_events", "lost_events"):
+            comparison[name] = comparison[name][:MAX_LISTED]
+        return {"settings": list(settings), "events": after, "opening_event_count": len(before), **comparison,
                 "evaluation_before": self.evaluation(self.settings), "evaluation_after": self.evaluation(settings),
                 "summary_before": evaluation_summary(self.evaluation(self.settings)),
                 "summary_after": evaluation_summary(self.evaluation(settings))}

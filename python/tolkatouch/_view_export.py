@@ -39,10 +39,13 @@ def export_data(data: ViewData, start: Optional[float], end: Optional[float]) ->
     if count <= 0:
         raise ExportTooLarge(f"the range from {start:g} s to {end:g} s holds no frames")
     info = data.info()
-    info["events"] = event_rows(data.baseline, start, end)
+    info["event_count"] = len(event_rows(data.baseline, start, end))
     info["labels"] = [label for label in info["labels"] if label["end"] >= start and label["start"] <= end]
     info["duration"] = float(seconds[last - 1])
     timeline = data.timeline(data.settings, start, end, columns=count, cap=count)
+    if "events_per_column" in timeline:
+        timeline.pop("events_per_column")
+        timeline["events"] = event_rows(data.baseline, start, end)
     frames = data.baseline.frames
     columns = {}
     for name in frames.__dataclass_fields__:

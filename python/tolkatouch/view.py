@@ -28,7 +28,7 @@ from typing import Optional, Sequence
 
 from . import Error
 from ._view_assets import ASSETS, asset_bytes
-from ._view_data import ViewData
+from ._view_data import MAX_COLUMNS, ViewData
 from .plot import error_lines, printable
 
 EXIT_FAILURE = 1
@@ -143,19 +143,22 @@ class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
             return value
 
         settings = query.get("set", data.settings)
+        data.wait_ready()
         try:
             if name == "info":
                 answer = data.info()
             elif name == "timeline":
                 start = number("from", float("-inf"))
                 end = number("to", float("inf"))
-                columns = number("columns", 1500, int)
+                columns = number("columns", MAX_COLUMNS, int)
                 with self.server.lock:
                     answer = data.timeline(settings, start, end, columns)
             elif name == "frame":
                 with self.server.lock:
                     if "t" in query:
                         index = data.frame_at(number("t"))
+                    elif "step" in query:
+                        index = data.event_frame(settings, number("n", kind=int), 1 if query["step"][0] == "next" else -1)
                     else:
                         index = number("n", kind=int)
                     answer = data.frame(settings, index)
@@ -172,6 +175,7 @@ class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
 
 
 def serve(data: ViewData, port: int = 0, open_browser: bool = True, out=sys.stdout) -> int:
+    """Serves the data until interrupted; data.prepare() runs here once the port is bound."""
     try:
         server = ViewServer(data, port)
     except OSError as error:
@@ -181,6 +185,8 @@ def serve(data: ViewData, port: int = 0, open_browser: bool = True, out=sys.stdo
             print(f"tolkatouch: port {port} on 127.0.0.1: {error_lines(error.strerror or error)}", file=sys.stderr)
         return EXIT_FAILURE
     print(server.url, file=out, flush=True)
+    # The opening replay runs while the browser loads the page's scripts.
+    threading.Thread(target=data.prepare, daemon=True).start()
     signal.signal(signal.SIGTERM, lambda *_: threading.Thread(target=server.shutdown, daemon=True).start())
     if open_browser:
         webbrowser.open(server.url)
@@ -217,7 +223,7 @@ def main(argv: Optional[Sequence[str]] = None, prog: Optional[str] = None) -> in
     if arguments.start is not None and arguments.end is not None and arguments.end <= arguments.start:
         parser.error("--to must come after --from")
     try:
-        data = ViewData.open(arguments.recording, arguments.labels, arguments.settings)
+        data = ViewData.open(arguments.recording, arguments.labels, arguments.settings, replay_now=bool(arguments.export))
         if arguments.export:
             from ._view_export import export_page
             export_page(data, arguments.export, arguments.start, arguments.end)

@@ -92,6 +92,34 @@ def test_a_short_range_comes_frame_by_frame(server, session_replay):
     assert timeline["score_max"] == pytest.approx(session_replay.frames.touch_score[expected].tolist(), abs=1e-3)
 
 
+def test_a_range_with_many_events_sends_their_count_per_column():
+    from tolkatouch._view_data import MAX_EVENTS, ViewData
+    recording = tolkatouch.synth("tap play-pause 100ms\nwait 200ms\n" * 250, seed=1)
+    data = ViewData(recording, "taps")
+    everything = data.timeline([], 0, 1e9)
+    assert len(data.baseline.events) > MAX_EVENTS
+    assert everything["events"] == [] and sum(everything["events_per_column"]) == len(data.baseline.events)
+    assert len(everything["events_per_column"]) == len(everything["x"])
+    a_few = data.timeline([], 10, 12)
+    assert "events_per_column" not in a_few and 0 < len(a_few["events"]) < MAX_EVENTS
+
+
+def test_a_what_if_timeline_carries_the_opening_events_beside_its_own(server, session_replay):
+    status, timeline = api(server, "timeline", "from=10&to=12&set=Algs.HoldTimeoutMilliseconds%3D900")
+    seconds = session_replay.events["seconds"]
+    assert status == 200
+    assert [e["seconds"] for e in timeline["opening_events"]] == pytest.approx(seconds[(seconds >= 10) & (seconds <= 12)].tolist())
+
+
+def test_step_finds_the_next_and_previous_event(server, session_replay):
+    frames = session_replay.frames
+    event_frames = np.searchsorted(frames.seconds, session_replay.events["seconds"])
+    status, after = api(server, "frame", "n=0&step=next")
+    assert status == 200 and after["index"] == event_frames[0]
+    status, before = api(server, "frame", f"n={event_frames[2]}&step=previous")
+    assert before["index"] == event_frames[1]
+
+
 def test_a_frame_carries_every_number_of_its_snapshot(server, session_replay):
     status, frame = api(server, "frame", "n=1234")
     values = frame["values"]

@@ -93,6 +93,15 @@
       marker: {symbol: "triangle-down", size: 9, color: events.map(e => KIND_COLOURS[e.kind] || "#000")}, showlegend: false};
   }
 
+  // A range with too many events to mark one by one comes as a count per column: drawn as a bar.
+  function eventTraces(tl, name, row, title) {
+    const traces = [eventTrace(tl[name], row, title)];
+    const counts = tl[name + "_per_column"];
+    if (counts) traces.push({type: "heatmap", name: title + " per column", x: tl.x, y: [row], z: [counts], xaxis: "x", yaxis: "y4",
+      colorscale: [[0, "#ffffff"], [1, "#444444"]], zmin: 0, showscale: false, hovertemplate: "%{z} events<extra>" + title + "</extra>"});
+    return traces;
+  }
+
   function timelineFigure(tl) {
     const traces = [
       {type: "heatmap", name: "readings", x: tl.x, y: tl.heat_rows, z: tl.heat, xaxis: "x", yaxis: "y", colorscale: "Viridis",
@@ -119,9 +128,9 @@
     }
     traces.push({type: "scatter", mode: "lines", name: "labels", x: labelX, y: labelY, text: labelText, xaxis: "x", yaxis: "y4",
       line: {color: "#444", width: 6}, hovertemplate: "%{text}<extra>label</extra>", showlegend: false});
-    const opening = whatIf ? info.events.filter(e => e.seconds >= tl.start && e.seconds <= tl.end) : tl.events;
-    traces.push(eventTrace(opening, 1, "events"));
-    if (whatIf) traces.push(eventTrace(tl.events, 0, "what-if events"));
+    const opening = tl.opening_events ? "opening_events" : "events";
+    traces.push(...eventTraces(tl, opening, 1, "events"));
+    if (tl.opening_events) traces.push(...eventTraces(tl, "events", 0, "what-if events"));
 
     const cursor = frameValues ? frameValues.seconds : null;
     const shapes = [
@@ -146,7 +155,7 @@
 
   async function drawTimeline() {
     const request = ++timelineRequest;
-    const tl = await api("timeline", {from: state.from, to: state.to, columns: 1500, set: settingsParam()});
+    const tl = await api("timeline", {from: state.from, to: state.to, columns: 1000, set: settingsParam()});
     if (request !== timelineRequest) return;
     const figure = timelineFigure(tl);
     applyingView = true;
@@ -181,7 +190,7 @@
     else return;
     writeHash();
     clearTimeout(relayoutTimer);
-    relayoutTimer = setTimeout(() => drawTimeline().catch(showError), 80);
+    relayoutTimer = setTimeout(() => drawTimeline().catch(showError), 30);
   }
 
   // Surface -----------------------------------------------------------------------------------
@@ -279,7 +288,11 @@
   }
 
   function stepEvent(direction) {
-    const events = (whatIf ? whatIf.events : info.events).filter(e => e.frame >= 0);
+    if (!EXPORTED) {
+      showFrame({n: state.frame, step: direction > 0 ? "next" : "previous"}).catch(showError);
+      return;
+    }
+    const events = EXPORTED.timeline.events.filter(e => e.frame >= 0);
     const now = frameValues ? frameValues.seconds : 0;
     const candidates = direction > 0 ? events.filter(e => e.seconds > now + 1e-9) : events.filter(e => e.seconds < now - 1e-9).reverse();
     if (candidates.length) showFrame({t: candidates[0].seconds}).catch(showError);
@@ -383,7 +396,7 @@
     document.getElementById("count-changed").textContent = `changed ${whatIf.changed}`;
     document.getElementById("count-added").textContent = `added ${whatIf.added}`;
     document.getElementById("count-lost").textContent = `lost ${whatIf.lost}`;
-    document.getElementById("count-events").textContent = `${whatIf.events.length} events (${info.events.length} before)`;
+    document.getElementById("count-events").textContent = `${whatIf.events.length} events (${whatIf.opening_event_count} before)`;
     box.dataset.changed = whatIf.changed;
     box.dataset.added = whatIf.added;
     box.dataset.lost = whatIf.lost;
@@ -421,7 +434,7 @@
     document.title = `${info.name} - tolkatouch view`;
     document.getElementById("title").textContent = info.name;
     document.getElementById("summary").textContent =
-      `${info.frames} frames, ${info.duration.toFixed(1)} s, ${info.events.length} events` +
+      `${info.frames} frames, ${info.duration.toFixed(1)} s, ${info.event_count} events` +
       (info.has_labels ? `, ${info.labels.length} labels` : "") + (info.settings.length ? ` (${info.settings.join(", ")})` : "");
     if (state.from === null) state.from = 0;
     if (state.to === null) state.to = info.duration;
