@@ -106,7 +106,7 @@ def main():
             times.append(elapsed)
         print(f"pan by one-minute windows: median {statistics.median(times) * 1000:.0f} ms, max {max(times) * 1000:.0f} ms")
 
-        # The page's whole round trip of a zoom (includes the page's 80 ms wait for more wheel turns).
+        # The page's whole round trip of a zoom (includes the page's 30 ms wait for more wheel turns).
         trips = []
         for start_s, end_s in ((600, 1200), (1800, 1860), (1805, 1806), (0, 3600)):
             trips.append(driver.execute_async_script("""
@@ -116,7 +116,7 @@ def main():
                 Plotly.relayout(view, {'xaxis.range': [arguments[0], arguments[1]]});
                 (function poll() { if (view.dataset.count !== before) done(performance.now() - t0); else setTimeout(poll, 2); })();
             """, start_s, end_s))
-        print(f"zoom in the page (relayout to redrawn timeline, 80 ms debounce included): "
+        print(f"zoom in the page (relayout to redrawn timeline, 30 ms debounce included): "
               f"{[round(t) for t in trips]} ms")
         process.terminate()
         process.wait()

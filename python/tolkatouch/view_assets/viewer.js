@@ -153,9 +153,13 @@
     return {traces, layout};
   }
 
-  async function drawTimeline() {
+  function fetchTimeline() {
+    return api("timeline", {from: state.from, to: state.to, columns: 1000, set: settingsParam()});
+  }
+
+  async function drawTimeline(pending) {
     const request = ++timelineRequest;
-    const tl = await api("timeline", {from: state.from, to: state.to, columns: 1000, set: settingsParam()});
+    const tl = await (pending || fetchTimeline());
     if (request !== timelineRequest) return;
     const figure = timelineFigure(tl);
     applyingView = true;
@@ -430,6 +434,9 @@
 
   async function start() {
     readHash();
+    // The first timeline is asked for beside the recording's description: one round trip less.
+    const firstTimeline = state.settings === null ? fetchTimeline() : null;
+    if (firstTimeline) firstTimeline.catch(() => {});
     info = await api("info", {});
     document.title = `${info.name} - tolkatouch view`;
     document.getElementById("title").textContent = info.name;
@@ -454,7 +461,7 @@
       drawSettings();
       drawWhatIf();
     }
-    await drawTimeline();
+    await drawTimeline(firstTimeline);
     await showFrame({n: state.frame});
     const view = document.getElementById("timeline");
     view.on("plotly_relayout", onRelayout);
