@@ -4,6 +4,7 @@ time range, every number of one frame, and what a settings change would have don
 
 from __future__ import annotations
 
+import json
 import os
 import threading
 from collections import OrderedDict
@@ -151,15 +152,30 @@ class ViewData:
             self._replays.popitem(last=False)
         return result
 
-    def evaluation(self, settings: Sequence[str]) -> Optional[dict]:
-        """eval's metrics for the recording under the settings, or None without labels."""
+    def _scored(self, settings: Sequence[str]):
+        """(eval's JSON, the mismatches as dicts of kind, start and end seconds) under the
+        settings, or None without labels."""
         if self.recording.labels is None:
             return None
         key = tuple(settings)
         if key not in self._evaluations:
-            import json
-            self._evaluations[key] = json.loads(_core.evaluate_recording(self.recording, list(key), TOLERANCE_US))
+            text, stretches = _core.evaluate_recording_mismatches(self.recording, list(key), TOLERANCE_US)
+            mismatches = [{"kind": kind, "start": start / 1e6, "end": end / 1e6} for kind, start, end in stretches]
+            self._evaluations[key] = (json.loads(text), sorted(mismatches, key=lambda m: m["start"]))
         return self._evaluations[key]
+
+    def evaluation(self, settings: Sequence[str]) -> Optional[dict]:
+        """eval's JSON for the recording under the settings, or None without labels."""
+        scored = self._scored(settings)
+        return scored[0] if scored else None
+
+    def mismatches(self, settings: Sequence[str], start: float = -np.inf, end: float = np.inf) -> list:
+        """Where eval finds the gestures and labels disagree (missed, false, split, merged, wrong
+        zone), the stretches that reach into start..end; empty without labels."""
+        scored = self._scored(settings)
+        if not scored:
+            return []
+        return [m for m in scored[1] if m["end"] >= start and m["start"] <= end]
 
     # What the page asks ---------------------------------------------------------------------
     def info(self) -> dict:
@@ -239,6 +255,7 @@ class ViewData:
         """The range's events one by one, or, past MAX_EVENTS, their count in each column; the
         opening settings' events beside them when the series are another replay's."""
         x = out["x"]
+        out["mismatches"] = self.mismatches(result.settings, start, end)[:MAX_EVENTS]
         for name, source in (("events", result), ("opening_events", self.baseline)):
             if name == "opening_events" and source is result:
                 continue

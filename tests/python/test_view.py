@@ -176,6 +176,19 @@ def test_with_labels_what_if_gives_eval_metrics_before_and_after(tmp_path):
             answer["summary_after"]["overall FN"]) == (6, 1, 1)
 
 
+def test_with_labels_the_timeline_marks_where_eval_finds_mismatches(tmp_path):
+    with running_server(labelled_recording(tmp_path)) as labelled:
+        status, opening = api(labelled, "timeline")
+        _, changed = api(labelled, "timeline", "set=Algs.HoldTimeoutMilliseconds%3D1000")
+    labels = tolkatouch.Recording.load(str(labelled_recording(tmp_path))).labels
+    missed_hold = next(l for l in labels if l.kind == "hold" and l.zone == "volume-down")
+    assert status == 200 and opening["mismatches"] == []
+    # The 900 ms hold on volume-down becomes a tap: its label is missed and the tap is false.
+    assert [m["kind"] for m in changed["mismatches"]] == ["missed", "false"]
+    assert changed["mismatches"][0]["start"] == pytest.approx(missed_hold.start_us / 1e6)
+    assert changed["mismatches"][0]["end"] == pytest.approx(missed_hold.end_us / 1e6)
+
+
 @pytest.mark.parametrize("query", ["n=abc", "n=-1", "n=99999999", "t=nan", "n=1e400"])
 def test_a_bad_frame_request_is_refused_with_a_reason(server, query):
     status, answer = api(server, "frame", query)

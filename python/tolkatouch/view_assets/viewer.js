@@ -8,7 +8,8 @@
     "hold-end": "#8c564b", "tap": "#2ca02c", "cancel": "#7f7f7f", "reset": "#000000"};
   const REGION_COLOURS = ["#ffffff", "#2ca02c", "#1f77b4", "#ff7f0e"];
   const HAND_COLOURS = ["#ffffff", "#17becf", "#d62728", "#999999"];
-  const BAND_ROWS = ["what-if events", "events", "labels", "active region", "hand"];
+  const BAND_ROWS = ["what-if events", "events", "eval mismatches", "labels", "active region", "hand"];
+  const MISMATCH_COLOURS = {"missed": "#d62728", "false": "#ff7f0e", "split": "#9467bd", "merged": "#8c564b", "wrong zone": "#e377c2"};
 
   const state = {from: null, to: null, frame: 0, settings: null};
   let info = null;
@@ -115,19 +116,28 @@
         line: {color: "#1f77b4", width: 1}, fill: tl.bucketed ? "tonexty" : "none"},
       {type: "scatter", mode: "lines", name: "classifier score", x: tl.x, y: tl.svm, xaxis: "x", yaxis: "y3",
         line: {color: "#999999", width: 0.7}},
-      {type: "heatmap", name: "hand", x: tl.x, y: [4], z: [tl.hand], xaxis: "x", yaxis: "y4", zmin: -0.5, zmax: 3.5,
+      {type: "heatmap", name: "hand", x: tl.x, y: [5], z: [tl.hand], xaxis: "x", yaxis: "y4", zmin: -0.5, zmax: 3.5,
         colorscale: discreteScale(HAND_COLOURS), showscale: false, hovertemplate: "hand %{z} (1 touching, 2 holding, 3 hold suppressed)<extra></extra>"},
-      {type: "heatmap", name: "active region", x: tl.x, y: [3], z: [tl.region], xaxis: "x", yaxis: "y4", zmin: -0.5, zmax: 3.5,
+      {type: "heatmap", name: "active region", x: tl.x, y: [4], z: [tl.region], xaxis: "x", yaxis: "y4", zmin: -0.5, zmax: 3.5,
         colorscale: discreteScale(REGION_COLOURS), showscale: false, hovertemplate: "region %{z}<extra></extra>"},
     ];
     const labelX = [], labelY = [], labelText = [];
     for (const label of info.labels) {
       if (label.end < tl.start || label.start > tl.end) continue;
       const text = label.kind + " " + (label.zone || "") + (label.to_zone ? " to " + label.to_zone : "");
-      labelX.push(label.start, label.end, null); labelY.push(2, 2, null); labelText.push(text, text, null);
+      labelX.push(label.start, label.end, null); labelY.push(3, 3, null); labelText.push(text, text, null);
     }
     traces.push({type: "scatter", mode: "lines", name: "labels", x: labelX, y: labelY, text: labelText, xaxis: "x", yaxis: "y4",
       line: {color: "#444", width: 6}, hovertemplate: "%{text}<extra>label</extra>", showlegend: false});
+    for (const [kind, colour] of Object.entries(MISMATCH_COLOURS)) {
+      const mismatchX = [], mismatchY = [];
+      for (const m of tl.mismatches || []) {
+        if (m.kind !== kind) continue;
+        mismatchX.push(m.start, Math.max(m.end, m.start + 0.02), null); mismatchY.push(2, 2, null);
+      }
+      if (mismatchX.length) traces.push({type: "scatter", mode: "lines", name: kind, x: mismatchX, y: mismatchY, xaxis: "x", yaxis: "y4",
+        line: {color: colour, width: 8}, hovertemplate: kind + "<extra>eval</extra>"});
+    }
     const opening = tl.opening_events ? "opening_events" : "events";
     traces.push(...eventTraces(tl, opening, 1, "events"));
     if (tl.opening_events) traces.push(...eventTraces(tl, "events", 0, "what-if events"));
@@ -148,7 +158,7 @@
         title: {text: "reading by zone"}, fixedrange: true},
       yaxis2: {domain: [0.42, 0.565], autorange: "reversed", type: "category", showticklabels: false, title: {text: "on"}, fixedrange: true},
       yaxis3: {domain: [0.20, 0.37], range: [-115, 115], title: {text: "score"}, fixedrange: true},
-      yaxis4: {domain: [0, 0.18], range: [-0.5, 4.5], tickvals: [0, 1, 2, 3, 4], ticktext: BAND_ROWS, tickfont: {size: 9}, fixedrange: true},
+      yaxis4: {domain: [0, 0.18], range: [-0.5, 5.5], tickvals: [0, 1, 2, 3, 4, 5], ticktext: BAND_ROWS, tickfont: {size: 9}, fixedrange: true},
     };
     return {traces, layout};
   }
