@@ -50,6 +50,14 @@ def test_path_tricks_are_not_found(server, rest):
     assert status == 404
 
 
+def test_a_symlink_out_beside_the_recording_is_not_found(tmp_path):
+    recording = labelled_recording(tmp_path)
+    (tmp_path / "outside").symlink_to("/etc")
+    with running_server(recording) as beside:
+        for rest in ("outside/passwd", "assets/outside/passwd", "everyday.labels.json", "api/outside"):
+            assert get(beside, f"/{beside.token}/{rest}")[0] == 404
+
+
 def test_the_page_and_its_scripts_are_served(server):
     status, page = get(server, f"/{server.token}/")
     assert status == 200 and b'src="assets/viewer.js"' in page
