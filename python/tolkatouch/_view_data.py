@@ -299,6 +299,7 @@ class ViewData:
         for name in frames.__dataclass_fields__:
             value = getattr(frames, name)[index]
             values[name] = value.tolist() if isinstance(value, np.ndarray) else value.item()
+        values["description"], values["virtual_description"] = _core.description_lines(values)
         for name in ("normalized", "virtual_normalized"):
             values[name] = [round(v, 4) for v in values[name]]
         for name in ("touch_score", "svm_score", "strength_rate", "strength_per_duration", "duration_ratio", "tap_score"):

@@ -29,7 +29,7 @@ from typing import Optional, Sequence
 from . import Error
 from ._view_assets import ASSETS, asset_bytes
 from ._view_data import MAX_COLUMNS, ViewData
-from .plot import error_lines, printable
+from ._errors import error_lines, printable
 
 EXIT_FAILURE = 1
 EXIT_USAGE = 2

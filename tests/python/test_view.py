@@ -139,6 +139,17 @@ def test_a_frame_carries_every_number_of_its_snapshot(server, session_replay):
     assert set(frames.__dataclass_fields__) <= set(values)
 
 
+def test_a_frame_carries_its_description_lines_as_the_debug_log_writes_them(server, tool):
+    status, frame = api(server, "frame", "n=1234")
+    log = run_tool(tool, "replay", "--fast", "--describe", str(SESSION)).stderr.splitlines()
+    number = frame["values"]["frame"]
+    touch = log.index(next(line for line in log if f"Frame {number} @" in line and "Touch State Description" in line))
+    virtual = log.index(next(line for line in log if f"Frame {number} @" in line and "Virtual State Description" in line))
+    assert status == 200
+    assert frame["values"]["description"] == log[touch + 1]
+    assert frame["values"]["virtual_description"] == log[virtual + 1]
+
+
 def test_a_time_picks_the_nearest_frame(server, session_replay):
     seconds = session_replay.frames.seconds
     status, frame = api(server, "frame", f"t={seconds[500] + 0.001}")
