@@ -60,6 +60,7 @@ class ViewServer(http.server.ThreadingHTTPServer):
 class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
     server: ViewServer
     protocol_version = "HTTP/1.1"
+    timeout = 60  # seconds a connection may stay silent; each has its own thread
     server_version = "tolkatouch-view"
     sys_version = ""
 
@@ -142,7 +143,8 @@ class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
                 raise ValueError(f"{key} must be a finite number, not {values[0]}")
             return value
 
-        settings = query.get("set", data.settings)
+        # "set=" alone asks for the defaults; no "set" at all, for the opening settings.
+        settings = [item for item in query["set"] if item] if "set" in query else data.settings
         data.wait_ready()
         try:
             if name == "info":

@@ -175,6 +175,15 @@ def test_what_if_counts_changed_added_and_lost_events():
     assert (counts["changed"], counts["added"], counts["lost"]) == (1, 1, 1)
 
 
+def test_an_empty_set_asks_for_the_defaults_and_none_for_the_opening_settings(tool):
+    with running_server(SESSION, settings=["HoldTimeoutMilliseconds=200"]) as opened:
+        _, opening = api(opened, "whatif")
+        _, defaults = api(opened, "whatif", "set=")
+    assert [(e["frame"], e["kind"]) for e in opening["events"]] == \
+        [(e["frame"], e["event"]) for e in json_events(tool, SESSION, "HoldTimeoutMilliseconds=200")]
+    assert [(e["frame"], e["kind"]) for e in defaults["events"]] == [(e["frame"], e["event"]) for e in json_events(tool, SESSION)]
+
+
 def test_a_bad_setting_is_shown_and_the_server_goes_on(server, tool):
     status, answer = api(server, "whatif", "set=Algs.HoldTimeoutMilliseconds%3D0")
     cli = run_tool(tool, "replay", "--fast", "--set", "Algs.HoldTimeoutMilliseconds=0", str(SESSION))

@@ -23,7 +23,8 @@
     const search = new URLSearchParams();
     for (const [key, value] of Object.entries(params)) {
       if (value === null || value === undefined) continue;
-      if (Array.isArray(value)) value.forEach(v => search.append(key, v));
+      if (Array.isArray(value) && value.length === 0) search.append(key, "");  // the defaults, not the opening settings
+      else if (Array.isArray(value)) value.forEach(v => search.append(key, v));
       else search.append(key, String(value));
     }
     return search.toString();
