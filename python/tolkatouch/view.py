@@ -233,7 +233,11 @@ def main(argv: Optional[Sequence[str]] = None, prog: Optional[str] = None) -> in
     except Error as error:
         print(f"tolkatouch: {error_lines(error)}", file=sys.stderr)
         return EXIT_USAGE if error.__class__.__name__ == "SettingError" else EXIT_FAILURE
-    except (OSError, ValueError) as error:
+    except OSError as error:
+        text = f"{error.filename}: {error.strerror}" if error.filename and error.strerror else str(error)
+        print(f"tolkatouch: {printable(text)}", file=sys.stderr)
+        return EXIT_FAILURE
+    except ValueError as error:
         print(f"tolkatouch: {error_lines(error)}", file=sys.stderr)
         return EXIT_FAILURE
     return serve(data, arguments.port, not arguments.no_browser)

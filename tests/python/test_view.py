@@ -273,6 +273,19 @@ def test_an_unreadable_recording_is_one_line(tool, tmp_path):
     assert result.stderr.startswith(f"tolkatouch: {missing}:") and result.stderr.count("\n") == 1
 
 
+def test_a_missing_labels_file_and_an_unwritable_export_are_one_line(tool, tmp_path):
+    result = run_tool(tool, "view", "--no-browser", "--labels", str(tmp_path / "none.labels.json"), str(SESSION))
+    assert (result.returncode, result.stderr) == (1, f"tolkatouch: {tmp_path / 'none.labels.json'}: No such file or directory\n")
+    out = tmp_path / "no" / "page.html"
+    result = run_tool(tool, "view", str(SESSION), "--export", str(out), "--from", "10", "--to", "11")
+    assert (result.returncode, result.stderr) == (1, f"tolkatouch: {out}: No such file or directory\n")
+
+
+def test_a_control_character_in_a_document_name_is_printed_escaped(tool, tmp_path):
+    result = run_tool(tool, "view", "--no-browser", str(tmp_path / "a\x1bb.json"))
+    assert result.returncode == 1 and "\x1b" not in result.stderr and "a\\x1bb.json" in result.stderr
+
+
 def test_a_bad_opening_setting_is_a_usage_error(tool):
     result = run_tool(tool, "view", "--no-browser", "--set", "Nope=1", str(SESSION))
     assert result.returncode == 2 and result.stderr.startswith("tolkatouch: ") and "Nope" in result.stderr
