@@ -134,10 +134,11 @@
       const mismatchX = [], mismatchY = [];
       for (const m of tl.mismatches || []) {
         if (m.kind !== kind) continue;
-        mismatchX.push(m.start, Math.max(m.end, m.start + 0.02), null); mismatchY.push(2, 2, null);
+        const y = kind === "missed" ? 2.18 : 1.82;  // a missed label and the gesture counted false side by side
+        mismatchX.push(m.start, Math.max(m.end, m.start + 0.02), null); mismatchY.push(y, y, null);
       }
       if (mismatchX.length) traces.push({type: "scatter", mode: "lines", name: kind, x: mismatchX, y: mismatchY, xaxis: "x", yaxis: "y4",
-        line: {color: colour, width: 8}, hovertemplate: kind + "<extra>eval</extra>"});
+        line: {color: colour, width: 5}, hovertemplate: kind + "<extra>eval</extra>"});
     }
     const opening = tl.opening_events ? "opening_events" : "events";
     traces.push(...eventTraces(tl, opening, 1, "events"));
@@ -295,7 +296,8 @@
     frameValues = answer.values;
     state.frame = answer.index;
     document.getElementById("frame-number").textContent = answer.index;
-    document.getElementById("frame-time").textContent = `(${frameValues.seconds.toFixed(3)} s, ${frameValues.transition_name})`;
+    document.getElementById("frame-time").textContent =
+      `(${frameValues.seconds.toFixed(3)} s, firmware frame ${frameValues.frame}, ${frameValues.transition_name})`;
     drawSurface();
     drawDetails();
     moveCursor();
