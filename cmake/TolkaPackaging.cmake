@@ -145,7 +145,7 @@ if(TARGET _tolkatouch AND DEFINED TOLKA_PYTHON_INSTALL_DIR)
   list(GET tolka_python 1 tolka_python_minor)
   math(EXPR tolka_python_next "${tolka_python_minor} + 1")
   set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
-      "tolkatouch (= ${TOLKA_PACKAGE_VERSION}), python3 (>= ${tolka_python_major}.${tolka_python_minor}~), python3 (<< ${tolka_python_major}.${tolka_python_next}), python3-numpy, python3-matplotlib, libc6 (>= 2.34), libgcc-s1 (>= 3.0), libstdc++6 (>= 12)")
+      "tolkatouch (= ${TOLKA_PACKAGE_VERSION}), python3 (>= ${tolka_python_major}.${tolka_python_minor}~), python3 (<< ${tolka_python_major}.${tolka_python_next}), python3-numpy, python3-matplotlib, python3-plotly, libc6 (>= 2.34), libgcc-s1 (>= 3.0), libstdc++6 (>= 12)")
 endif()
 
 include(CPack)

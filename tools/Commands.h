@@ -28,5 +28,6 @@ void addPlotCommand(CLI::App& app);
 void addTuneCommand(CLI::App& app);
 void addPlotEvalCommand(CLI::App& app);
 void addRecordCommand(CLI::App& app);
+void addViewCommand(CLI::App& app);
 
 }  // namespace TolkaTouch::Tools

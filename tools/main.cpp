@@ -51,6 +51,7 @@ int main(int argc, char** argv) {
     addTuneCommand(app);
     addPlotEvalCommand(app);
     addRecordCommand(app);
+    addViewCommand(app);
 
     // A first word that names no subcommand is a typo far more often than anything else.
     if (argc > 1 && argv[1][0] != '-') {

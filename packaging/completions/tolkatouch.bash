@@ -3,7 +3,7 @@
 _tolkatouch() {
     local cur prev words cword
     _init_completion || return
-    local subcommands="replay synth show convert eval sweep plot plot-eval tune record uhid keys prop devices log watch"
+    local subcommands="replay synth show convert eval sweep plot plot-eval tune record view uhid keys prop devices log watch"
     if [[ $cword -eq 1 ]]; then
         COMPREPLY=($(compgen -W "$subcommands --help --version" -- "$cur"))
         return
@@ -20,6 +20,7 @@ _tolkatouch() {
         tune) options="--trials --timeout --space --objective --max-false-activations-per-hour --pareto --heldout --seed --sampler --pruner --storage --study --jobs --tolerance --write-settings --plots --json --help" ;;
         plot-eval) options="--output --kind --setting --metric --point --help" ;;
         record) options="--output --device --vendor --product --duration --max-reports --rotate --with-events --socket --help" ;;
+        view) options="--labels --set --port --no-browser --export --from --to --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)

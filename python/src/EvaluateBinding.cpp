@@ -9,6 +9,7 @@
 
 #include "tools/workbench/Evaluation.h"
 #include "tools/workbench/EvaluationJson.h"
+#include "tools/workbench/Matching.h"
 #include "tools/workbench/Sweep.h"
 
 #include "Errors.h"
@@ -79,6 +80,26 @@ void addEvaluate(py::module_& module) {
         },
         py::arg("recording"), py::arg("settings"), py::arg("tolerance_us"),
         "One labelled recording scored under the settings, as `eval --json` text.");
+
+    module.def(
+        "evaluate_recording_mismatches",
+        [](const Recording& recording, const std::vector<std::string>& assignments, int64_t toleranceUs) {
+            if (!recording.labels) throw DocumentFailure("the recording has no labels");
+            Workbench::Evaluation evaluation = emptyEvaluation(assignments, toleranceUs);
+            std::vector<Workbench::Mismatch> mismatches;
+            {
+                py::gil_scoped_release unlocked;
+                evaluation.counts = Workbench::evaluateRecording(recording.recording(), *recording.labels, evaluation.settings,
+                                                                 toleranceUs, &mismatches);
+            }
+            py::list stretches;
+            for (const Workbench::Mismatch& mismatch : mismatches)
+                stretches.append(py::make_tuple(std::string(Workbench::mismatchName(mismatch.kind)), mismatch.startUs, mismatch.endUs));
+            return py::make_tuple(jsonText(evaluation), stretches);
+        },
+        py::arg("recording"), py::arg("settings"), py::arg("tolerance_us"),
+        "(`eval --json` text, [(kind, start_us, end_us)]): the recording scored under the settings and where its "
+        "gestures and labels disagree: missed, false, split, merged, wrong zone.");
 
     module.def(
         "failed_evaluation",

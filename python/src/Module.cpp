@@ -9,6 +9,7 @@
 #include "ReplayBinding.h"
 #include "SettingsBinding.h"
 #include "SynthBinding.h"
+#include "ViewBinding.h"
 
 PYBIND11_MODULE(_tolkatouch, module) {
     module.doc() = "The C++ side of the tolkatouch package; use the names tolkatouch exports.";
@@ -18,4 +19,5 @@ PYBIND11_MODULE(_tolkatouch, module) {
     TolkaTouch::Python::addSynth(module);
     TolkaTouch::Python::addEvaluate(module);
     TolkaTouch::Python::addSettings(module);
+    TolkaTouch::Python::addView(module);
 }

@@ -56,3 +56,16 @@ def synth(script: str, seed: int = 1) -> Recording:
 
 def replay_arrays(recording: Recording, settings: List[str]) -> Tuple[np.ndarray, Dict[str, np.ndarray]]:
     """(events, frame columns) of a replay; use tolkatouch.replay."""
+
+def settings_table() -> List[Dict[str, Any]]:
+    """Every setting of the settings table: key ('Algs.X'), type, default, minimum, maximum, accepted, meaning, tunable."""
+def surface_pads() -> List[Tuple[int, float, float]]:
+    """(pixel, x, y) of every pad on the surface, as the image drawing places them."""
+def virtual_groups() -> List[str]:
+    """The letters of each of the 23 virtual pixels."""
+def description_lines(values: Dict[str, Any]) -> Tuple[str, str]:
+    """(touch state line, virtual state line) of one frame from its tolkatouch.Frames numbers."""
+def attach_labels(recording: Recording, text: str, subject: str) -> None:
+    """Gives the recording the labels of a labels document's text; DocumentError naming the subject."""
+def evaluate_recording_mismatches(recording: Recording, settings: List[str], tolerance_us: int) -> Tuple[str, List[Tuple[str, int, int]]]:
+    """(eval --json text, [(kind, start_us, end_us)]): missed, false, split, merged, wrong zone."""

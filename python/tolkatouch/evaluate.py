@@ -190,7 +190,7 @@ def main(argv: Optional[Sequence[str]] = None) -> int:
             client = Client(arguments.scheduler)
         results = evaluate(arguments.corpus, arguments.grid or None, client, arguments.tolerance, arguments.settings)
     except (Error, ValueError, OSError) as error:
-        from .plot import error_lines
+        from ._errors import error_lines
 
         print(f"tolkatouch: {error_lines(error)}", file=sys.stderr)
         return 2 if error.__class__.__name__ == "SettingError" else 1

@@ -19,22 +19,12 @@ import matplotlib
 matplotlib.use("Agg")
 
 from . import Error, Recording, replay  # noqa: E402
+from ._errors import error_lines, printable  # noqa: E402
 from ._plot_figure import recording_figure  # noqa: E402
 
 FORMATS = ("png", "svg", "pdf")
 EXIT_FAILURE = 1
 EXIT_USAGE = 2
-
-
-def printable(text: str) -> str:
-    """Control characters shown escaped, so that nothing quoted reaches the terminal as a command."""
-    return "".join(f"\\x{ord(c):02x}" if ord(c) < 0x20 or ord(c) == 0x7F else c for c in text)
-
-
-def error_lines(error: BaseException) -> str:
-    """An error as the command line prints it: each line printable, a document's reason and
-    position on a second line."""
-    return "\n".join(printable(line) for line in str(error).split("\n"))
 
 
 def output_format(path: str) -> str:

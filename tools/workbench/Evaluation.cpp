@@ -191,7 +191,7 @@ std::vector<std::string> shardOf(const std::vector<std::string>& documents, size
 }
 
 Counts evaluateRecording(const PipelineRecording& recording, const std::vector<Label>& labels, const Settings& settings,
-                         int64_t toleranceUs) {
+                         int64_t toleranceUs, std::vector<Mismatch>* mismatches) {
     Tools::Replayer replayer{PipelineRecording(recording)};
     const uint64_t origin = replayer.origin();
     GestureCollector collector;
@@ -208,7 +208,7 @@ Counts evaluateRecording(const PipelineRecording& recording, const std::vector<L
     });
     const uint64_t durationUs = durationUsOf(recording);
     Counts counts;
-    matchRecording(labels, collector.finish(static_cast<int64_t>(durationUs)), durationUs, toleranceUs, counts);
+    matchRecording(labels, collector.finish(static_cast<int64_t>(durationUs)), durationUs, toleranceUs, counts, mismatches);
     counts.recordings = 1;
     counts.frames = recording.frames().size();
     counts.durationUs = durationUs;

@@ -60,9 +60,10 @@ CorpusListing listCorpus(const std::vector<std::string>& paths);
 // Share index (1-based) of count: every count-th document from the index-th on.
 std::vector<std::string> shardOf(const std::vector<std::string>& documents, size_t index, size_t count);
 
-// One recording against its labels: its tallies, with recordings, frames and duration set.
+// One recording against its labels: its tallies, with recordings, frames and duration set; with
+// mismatches, also where the gestures and the labels disagree (Matching.h).
 Counts evaluateRecording(const PipelineRecording& recording, const std::vector<Label>& labels, const Settings& settings,
-                         int64_t toleranceUs);
+                         int64_t toleranceUs, std::vector<Mismatch>* mismatches = nullptr);
 
 // Reads and evaluates every document, each with DOC.labels.json beside it.
 Evaluation evaluate(const std::vector<std::string>& documents, const EvaluationOptions& options);

@@ -33,14 +33,33 @@ void countFalsePositive(const RecognisedGesture& gesture, Counts& counts) {
     if (kind && validZone(gesture.zone)) ++counts.classes[*kind][zoneIndex(gesture.zone)].falsePositives;
 }
 
+void note(std::vector<Mismatch>* mismatches, MismatchKind kind, int64_t startUs, int64_t endUs) {
+    if (mismatches) mismatches->push_back(Mismatch{kind, startUs, endUs});
+}
+
+void note(std::vector<Mismatch>* mismatches, MismatchKind kind, const RecognisedGesture& gesture) {
+    note(mismatches, kind, gesture.startUs, gesture.endUs);
+}
+
 bool sameKind(Intended intended, Recognised recognised) {
     return scoredIndex(intended) && scoredIndex(intended) == scoredIndex(recognised);
 }
 
 }  // namespace
 
+std::string_view mismatchName(MismatchKind kind) {
+    switch (kind) {
+    case MismatchKind::Missed: return "missed";
+    case MismatchKind::False: return "false";
+    case MismatchKind::Split: return "split";
+    case MismatchKind::Merged: return "merged";
+    case MismatchKind::WrongZone: return "wrong zone";
+    }
+    return "missed";
+}
+
 void matchRecording(const std::vector<Label>& labels, const std::vector<RecognisedGesture>& recognised, uint64_t durationUs,
-                    int64_t toleranceUs, Counts& counts) {
+                    int64_t toleranceUs, Counts& counts, std::vector<Mismatch>* mismatches) {
     // Which label each recognised gesture falls on.
     std::vector<std::optional<size_t>> labelOf(recognised.size());
     std::vector<std::vector<size_t>> onLabel(labels.size());
@@ -64,6 +83,7 @@ void matchRecording(const std::vector<Label>& labels, const std::vector<Recognis
     for (size_t g = 0; g < recognised.size(); ++g) {
         if (labelOf[g]) continue;
         countFalsePositive(recognised[g], counts);
+        note(mismatches, MismatchKind::False, recognised[g]);
         ++counts.confusion[none][static_cast<size_t>(recognised[g].kind)];
     }
 
@@ -76,12 +96,18 @@ void matchRecording(const std::vector<Label>& labels, const std::vector<Recognis
         ++counts.confusion[static_cast<size_t>(label.kind)][static_cast<size_t>(outcomeKind)];
         if (fallen.size() > 1) {
             ++counts.split;
-            for (size_t i = 1; i < fallen.size(); ++i) countFalsePositive(recognised[fallen[i]], counts);
+            for (size_t i = 1; i < fallen.size(); ++i) {
+                countFalsePositive(recognised[fallen[i]], counts);
+                note(mismatches, MismatchKind::Split, recognised[fallen[i]]);
+            }
         }
 
         const auto kind = scoredIndex(label.kind);
         if (!kind) {
-            if (outcome) countFalsePositive(*outcome, counts);
+            if (outcome) {
+                countFalsePositive(*outcome, counts);
+                note(mismatches, MismatchKind::False, *outcome);
+            }
             continue;
         }
         ++counts.intendedGestures;
@@ -95,10 +121,17 @@ void matchRecording(const std::vector<Label>& labels, const std::vector<Recognis
         ++counts.classes[*kind][zoneIndex(label.zone)].falseNegatives;
         if (!outcome) {
             ++counts.falseRejects;
+            note(mismatches, MismatchKind::Missed, label.startUs, label.endUs);
             continue;
         }
         countFalsePositive(*outcome, counts);
-        if (rightKind) ++counts.wrongPlace;
+        if (rightKind) {
+            ++counts.wrongPlace;
+            note(mismatches, MismatchKind::WrongZone, *outcome);
+        } else {
+            note(mismatches, MismatchKind::Missed, label.startUs, label.endUs);
+            note(mismatches, MismatchKind::False, *outcome);
+        }
     }
 
     // A gesture that runs on over a later label nothing fell on took that label's touch into itself.
@@ -108,6 +141,7 @@ void matchRecording(const std::vector<Label>& labels, const std::vector<Recognis
             if (later && onLabel[l].empty() && scoredIndex(labels[l].kind) && recognised[g].startUs < labels[l].startUs &&
                 recognised[g].endUs > labels[l].startUs + toleranceUs) {
                 ++counts.merged;
+                note(mismatches, MismatchKind::Merged, recognised[g]);
                 break;
             }
         }

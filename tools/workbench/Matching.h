@@ -20,6 +20,7 @@
 //   recognised in it count toward the false activations per hour.
 
 #include <cstdint>
+#include <string_view>
 #include <vector>
 
 #include "tools/workbench/Counts.h"
@@ -30,8 +31,23 @@ namespace TolkaTouch::Workbench {
 
 inline constexpr int64_t kDefaultToleranceUs = 100'000;
 
-// Adds the recording's tallies to counts; durationUs is its length, first frame to last.
+// Where the recognised gestures and the labels disagree, one stretch each, for drawing on a
+// timeline: a label nothing right fell on (missed: the label's stretch), a gesture counted as a
+// false positive (false: the gesture's), a further gesture on one label (split), a gesture that
+// ran on over a later label (merged) and the intended kind in another zone (wrong zone: the
+// gesture's). A wrong kind on a label is missed and false, as it counts.
+enum class MismatchKind : uint8_t { Missed, False, Split, Merged, WrongZone };
+struct Mismatch {
+    MismatchKind kind = MismatchKind::Missed;
+    int64_t startUs = 0;  // from the first frame
+    int64_t endUs = 0;
+    bool operator==(const Mismatch&) const = default;
+};
+std::string_view mismatchName(MismatchKind kind);  // "missed", "false", "split", "merged", "wrong zone"
+
+// Adds the recording's tallies to counts; durationUs is its length, first frame to last. With
+// mismatches, also appends every disagreement there, in the order they are counted.
 void matchRecording(const std::vector<Label>& labels, const std::vector<RecognisedGesture>& recognised, uint64_t durationUs,
-                    int64_t toleranceUs, Counts& counts);
+                    int64_t toleranceUs, Counts& counts, std::vector<Mismatch>* mismatches = nullptr);
 
 }  // namespace TolkaTouch::Workbench

@@ -121,6 +121,35 @@ TEST(MatchingTest, NearestLabelStartTakesAGestureWithinReachOfTwo) {
     EXPECT_EQ(counts.latencyUs[kTap], std::vector<int64_t>{50'000});
 }
 
+std::vector<Mismatch> mismatches(const std::vector<Label>& labels, const std::vector<RecognisedGesture>& recognised) {
+    Counts counts;
+    std::vector<Mismatch> found;
+    matchRecording(labels, recognised, 10'000'000, kTolerance, counts, &found);
+    return found;
+}
+
+Mismatch stretch(MismatchKind kind, int64_t startMs, int64_t endMs) { return Mismatch{kind, startMs * 1000, endMs * 1000}; }
+
+TEST(MatchingTest, MismatchesAreTheMissedLabelAndTheFalseGestureOfATapTooLate) {
+    EXPECT_EQ(mismatches({label(Intended::Tap, PixelRegion::VolumeUp, 1000, 1120)},
+                         {gesture(Recognised::Tap, PixelRegion::VolumeUp, 1221, 1300, 1300)}),
+              (std::vector<Mismatch>{stretch(MismatchKind::False, 1221, 1300), stretch(MismatchKind::Missed, 1000, 1120)}));
+}
+
+TEST(MatchingTest, MismatchesNameSplitsMergesAndWrongZones) {
+    EXPECT_EQ(mismatches({label(Intended::Tap, PixelRegion::PlayPause, 1000, 1100)},
+                         {gesture(Recognised::Tap, PixelRegion::PlayPause, 1000, 1090, 1090),
+                          gesture(Recognised::Tap, PixelRegion::PlayPause, 1150, 1190, 1190)}),
+              (std::vector<Mismatch>{stretch(MismatchKind::Split, 1150, 1190)}));
+    EXPECT_EQ(mismatches({label(Intended::Hold, PixelRegion::PlayPause, 1000, 2000), label(Intended::Tap, PixelRegion::VolumeUp, 2500, 2600)},
+                         {gesture(Recognised::Hold, PixelRegion::PlayPause, 1000, 1500, 3000)}),
+              (std::vector<Mismatch>{stretch(MismatchKind::Missed, 2500, 2600), stretch(MismatchKind::Merged, 1000, 3000)}));
+    EXPECT_EQ(mismatches({label(Intended::Tap, PixelRegion::VolumeUp, 1000, 1100)},
+                         {gesture(Recognised::Tap, PixelRegion::VolumeDown, 1000, 1090, 1090)}),
+              (std::vector<Mismatch>{stretch(MismatchKind::WrongZone, 1000, 1090)}));
+    EXPECT_EQ(mismatchName(MismatchKind::WrongZone), "wrong zone");
+}
+
 TEST(MatchingTest, RecordingWithoutLabelsCountsEveryGestureAsAFalseActivation) {
     const Counts counts = match({}, {gesture(Recognised::Tap, PixelRegion::PlayPause, 1000, 1100, 1100),
                                      gesture(Recognised::Hold, PixelRegion::VolumeUp, 5000, 5500, 6000)},
