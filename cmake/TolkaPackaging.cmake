@@ -144,8 +144,11 @@ if(TARGET _tolkatouch AND DEFINED TOLKA_PYTHON_INSTALL_DIR)
   list(GET tolka_python 0 tolka_python_major)
   list(GET tolka_python 1 tolka_python_minor)
   math(EXPR tolka_python_next "${tolka_python_minor} + 1")
+  # The modules the package imports: numpy (arrays), matplotlib (plots), plotly (the viewer's page),
+  # Dask (evaluate), Optuna (tune); CMA-ES and scikit-learn only for one sampler and one plot.
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_RECOMMENDS "python3-cmaes, python3-sklearn")
   set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
-      "tolkatouch (= ${TOLKA_PACKAGE_VERSION}), python3 (>= ${tolka_python_major}.${tolka_python_minor}~), python3 (<< ${tolka_python_major}.${tolka_python_next}), python3-numpy, python3-matplotlib, python3-plotly, libc6 (>= 2.34), libgcc-s1 (>= 3.0), libstdc++6 (>= 12)")
+      "tolkatouch (= ${TOLKA_PACKAGE_VERSION}), python3 (>= ${tolka_python_major}.${tolka_python_minor}~), python3 (<< ${tolka_python_major}.${tolka_python_next}), python3-numpy, python3-matplotlib, python3-plotly, python3-dask, python3-distributed, python3-optuna, libc6 (>= 2.34), libgcc-s1 (>= 3.0), libstdc++6 (>= 12)")
 endif()
 
 include(CPack)
