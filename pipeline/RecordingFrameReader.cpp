@@ -52,6 +52,7 @@ public:
     size_t read(char* into, size_t capacity) {
         if (_fd < 0) {
             const size_t count = std::min(capacity, _bytes.size() - _at);
+            if (count == 0) return 0;  // an empty vector's data() may be null, which memcpy may not take
             std::memcpy(into, _bytes.data() + _at, count);
             _at += count;
             return count;

@@ -28,6 +28,7 @@ import json
 import math
 import os
 import sys
+import time
 from concurrent.futures import ThreadPoolExecutor
 from dataclasses import dataclass, field
 from typing import Dict, List, Optional, Sequence
@@ -324,12 +325,8 @@ def open_study(storage, name: str, search: Search, heldout_fraction: float, samp
     if storage is not None:
         existing = {summary.study_name: summary for summary in optuna.get_all_study_summaries(storage)}
         if name in existing:
-            study = optuna.load_study(study_name=name, storage=storage, sampler=sampler, pruner=pruner)
-            made = study.user_attrs.get("tolkatouch")
-            if made != json.loads(json.dumps(description)):
-                raise TuneError(f"--study {name}: the study in the storage searched another space, objective or "
-                                f"split ({json.dumps(made)}); name another study")
-            return study
+            return _resumed_study(optuna.load_study(study_name=name, storage=storage, sampler=sampler,
+                                                    pruner=pruner), name, description)
     directions = ["maximize", "minimize"] if search.pareto else [
         "maximize" if _core.higher_is_better(search.objective) else "minimize"]
     try:
@@ -337,10 +334,30 @@ def open_study(storage, name: str, search: Search, heldout_fraction: float, samp
                                     directions=directions)
     except optuna.exceptions.DuplicatedStudyError:
         # Another process sharing the storage made it a moment ago, with the defaults queued.
-        return optuna.load_study(study_name=name, storage=storage, sampler=sampler, pruner=pruner)
+        return _resumed_study(optuna.load_study(study_name=name, storage=storage, sampler=sampler, pruner=pruner),
+                              name, description)
     study.set_user_attr("tolkatouch", description)
     # Only the process that made the study queues the defaults, so that they are its first trial, once.
     study.enqueue_trial(_defaults_params(search.space))
+    return study
+
+
+# How long a process that finds a study without its description waits for the process that is
+# making it (creating a study and describing it are two writes to the storage).
+_DESCRIPTION_WAIT_SECONDS = 10.0
+
+
+def _resumed_study(study, name: str, description: dict):
+    """The study, once its description matches ours; TuneError when it searched something else."""
+    wanted = json.loads(json.dumps(description))
+    deadline = time.monotonic() + _DESCRIPTION_WAIT_SECONDS
+    made = study.user_attrs.get("tolkatouch")
+    while made is None and time.monotonic() < deadline:
+        time.sleep(0.05)
+        made = study.user_attrs.get("tolkatouch")
+    if made != wanted:
+        raise TuneError(f"--study {name}: the study in the storage searched another space, objective or "
+                        f"split ({json.dumps(made)}); name another study")
     return study
 
 

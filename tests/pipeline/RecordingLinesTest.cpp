@@ -120,6 +120,18 @@ TEST(RecordingLinesTest, LastLineWithoutNewlineThatParsesIsRead) {
     EXPECT_EQ(framesOf(*reader).size(), 1u);
 }
 
+TEST(RecordingLinesTest, NoBytesAtAllFailsAsAnInvalidContainerAtTheFirstByte) {
+    try {
+        auto reader = readerOf("");
+        Frame frame;
+        reader->next(frame);
+        FAIL() << "no error";
+    } catch (const RecordingReadError& error) {
+        EXPECT_STREQ(error.what(), "migrateSerializedContainer failed: invalid container");
+        EXPECT_EQ(error.detail().rfind("byte 0 (line 1, column 1): ", 0), 0u) << error.detail();
+    }
+}
+
 TEST(RecordingLinesTest, CompleteLineThatDoesNotParseFailsWithTheLineNumber) {
     auto reader = readerOf(kHeader + "{\"Type\":\"InputReport\",\"Timestamp\":5,\"Report\":\"01 \"}\n{\"Type\": tru}\n");
     Frame frame;

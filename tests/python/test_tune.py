@@ -5,12 +5,14 @@ resumes and is shared, and bad input is refused with one line naming it, the stu
 import json
 import os
 import subprocess
+import threading
 
 import optuna
 import pytest
 
 import tolkatouch
 from tolkatouch import tune as tuning
+from tolkatouch._tune_space import parse_space
 from tolkatouch._tune_split import split_corpus, stratum
 
 from conftest import EXAMPLES, run_tool
@@ -106,6 +108,28 @@ def test_two_processes_sharing_one_journal_run_the_trials_asked_for(corpus, tool
     assert [process.returncode for process in processes] == [0, 0], outputs
     counted = [t for t in study_trials(storage) if not t.user_attrs.get("surplus")]
     assert [t.number for t in counted] == list(range(8))
+
+
+def a_search():
+    return tuning.Search(tuple(parse_space(SPACE)), "f1", None, 100_000, False, True, 4)
+
+
+def test_a_study_found_before_its_maker_described_it_is_joined_once_the_description_lands(tmp_path):
+    storage = tuning.open_storage(f"journal:{tmp_path}/tune.log")
+    made = optuna.create_study(storage=storage, study_name="race")
+    description = tuning._study_description(a_search(), 0.25)
+    threading.Timer(0.3, made.set_user_attr, ("tolkatouch", description)).start()
+    joined = tuning.open_study(storage, "race", a_search(), 0.25, None, None)
+    assert joined.user_attrs["tolkatouch"] == json.loads(json.dumps(description))
+
+
+def test_a_study_never_described_is_refused_after_the_wait(tmp_path, monkeypatch):
+    monkeypatch.setattr(tuning, "_DESCRIPTION_WAIT_SECONDS", 0.2)
+    storage = tuning.open_storage(f"journal:{tmp_path}/tune.log")
+    optuna.create_study(storage=storage, study_name="orphan")
+    with pytest.raises(tuning.TuneError, match=r"^--study orphan: the study in the storage searched another space, "
+                                               r"objective or split \(null\); name another study$"):
+        tuning.open_study(storage, "orphan", a_search(), 0.25, None, None)
 
 
 def test_pruning_stops_hopeless_trials_on_growing_shares(corpus):

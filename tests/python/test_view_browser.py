@@ -37,7 +37,10 @@ def browser():
                      "--no-first-run", "--disable-extensions", "--disable-background-networking"):
         options.add_argument(argument)
     options.set_capability("goog:loggingPrefs", {"browser": "ALL"})
-    driver = webdriver.Chrome(service=Service(DRIVER), options=options)
+    # The browser is not ours: under a sanitizer build the runtime preloaded for the interpreter
+    # must not reach it.
+    environment = {key: value for key, value in os.environ.items() if key not in ("LD_PRELOAD", "ASAN_OPTIONS")}
+    driver = webdriver.Chrome(service=Service(DRIVER, env=environment), options=options)
     yield driver
     driver.quit()
 
