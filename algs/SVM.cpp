@@ -38,8 +38,9 @@ constexpr size_t kRankCount = SVM::kRankCount;
 // The score's arithmetic in two machine variants picked once at load time: one for processors with
 // a fused multiply-add instruction and wide vectors, one for the rest. Both give the same bits: every
 // step is a single correctly rounded IEEE operation (subtract, divide, fused multiply-add), whichever
-// instructions carry it out.
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__)
+// instructions carry it out. The thread sanitizer's runtime is not up yet when the loader picks a
+// variant, and its instrumented picker crashes there, so that build has only the default variant.
+#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) && !defined(__SANITIZE_THREAD__)
 #define TOLKA_SCORE_VARIANTS __attribute__((target_clones("arch=x86-64-v3", "default")))
 #else
 #define TOLKA_SCORE_VARIANTS
