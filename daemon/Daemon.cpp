@@ -133,7 +133,7 @@ int Daemon::run() {
         armRepeatTimer();
     }
     sd_notify(0, "STOPPING=1");
-    return 0;
+    return _simulationFailed ? 1 : 0;
 }
 
 void Daemon::addSources() {
@@ -174,7 +174,9 @@ void Daemon::startDevices() {
     properties.emplace("VendorID", PropertyValue(static_cast<unsigned>(_options.vendor)));
     properties.emplace("ProductID", PropertyValue(static_cast<unsigned>(_options.product)));
     properties.emplace("Transport", PropertyValue("Virtual"));
-    _simulated = SimulatedHIDDevice::create(std::move(properties));
+    // Reports are queued ahead of their time and handed out by the device's timer: the report
+    // thread wakes once per report, as for a real surface's read.
+    _simulated = SimulatedHIDDevice::create(std::move(properties), SimulatedHIDDevice::Delivery::AtDueTime);
     if (!_simulated) throw std::runtime_error("cannot create the simulated device");
     // The feature reports a real surface answers, as the virtual surface of `tolkatouch uhid` does.
     for (auto& [id, bytes] : defaultFeatureReports()) _simulated->setFeatureReport(id, std::move(bytes));
@@ -186,8 +188,8 @@ void Daemon::startDevices() {
     // feeder has finished (end of the document), so the feeder may hold on to it.
     PluginInstance* instance = _devices.begin()->second->instance.get();
     SimulationFeeder::Target target;
-    target.writeReport = [this](const uint8_t* bytes, size_t length) {
-        if (_simulated->writeInputReport(bytes, length)) ++_simulatedWritten;
+    target.writeReport = [this](const uint8_t* bytes, size_t length, uint64_t due) {
+        if (_simulated->writeInputReport(bytes, length, due)) ++_simulatedWritten;
     };
     target.applySetting = [this, instance](const std::string& key, const PropertyValue& value) {
         // A recorded setting follows the reports before it, as it did when it was recorded.
@@ -197,6 +199,13 @@ void Daemon::startDevices() {
         _log.log("setting Pipeline.%s = %s %s", key.c_str(), value.description().c_str(), taken ? "taken" : "refused");
     };
     target.finished = [this] { _simulated->simulateRemoval(); };
+    // A frame further on that does not read: the frames before it have been played; the daemon
+    // ends as for a document refused at the start, with status 1.
+    target.failed = [this](const std::string& message) {
+        _log.error("%s", message.c_str());
+        _simulationFailed = true;
+        _simulated->simulateRemoval();
+    };
     _feeder->start(std::move(target));
 }
 

@@ -6,6 +6,7 @@
 // main thread's run loop: udev news, the control socket, key repeats, signals, and the events,
 // which the dispatch queue hands over as run loop blocks.
 
+#include <atomic>
 #include <cstdint>
 #include <cstdio>
 #include <map>
@@ -63,7 +64,7 @@ public:
     Daemon& operator=(const Daemon&) = delete;
 
     // Serves until SIGTERM or SIGINT, or until the simulated device's document has been played.
-    // Answers the process's exit status.
+    // Answers the process's exit status: 1 when the simulated document stopped reading part way.
     int run();
 
     // ControlTarget: called on the control socket's workers, while the run loop goes on.
@@ -106,6 +107,7 @@ private:
     std::shared_ptr<SimulatedHIDDevice> _simulated;
     std::shared_ptr<CountingHIDDevice> _simulatedCounter;
     uint64_t _simulatedWritten = 0;  // reports written by the feeder (its thread only)
+    std::atomic<bool> _simulationFailed{false};  // the document did not read to its end
     int _signalFd = -1;
     int _timerFd = -1;
     int _logTimerFd = -1;

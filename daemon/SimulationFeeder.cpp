@@ -1,52 +1,44 @@
 #include "daemon/SimulationFeeder.h"
 
-#include <time.h>
-
 #include <algorithm>
-#include <cerrno>
-#include <cstring>
-#include <fstream>
-#include <iterator>
-#include <optional>
 #include <stdexcept>
 #include <system_error>
 
-#include "pipeline/PipelineRecording.h"
 #include "pipeline/RecordingFrameReader.h"
 
 namespace TolkaTouch {
 
 namespace {
-// The playback's downstream: reports go to the device, settings to the service.
+using Clock = std::chrono::steady_clock;  // CLOCK_MONOTONIC, the device's timer's clock
+
+uint64_t nowNanoseconds() {
+    return static_cast<uint64_t>(std::chrono::duration_cast<std::chrono::nanoseconds>(Clock::now().time_since_epoch()).count());
+}
+
+// The playback's downstream: reports go to the device with their due time, settings to the service.
 class FeederInput final : public PipelineInput {
 public:
-    explicit FeederInput(SimulationFeeder::Target& target) : _target(target) {}
+    FeederInput(SimulationFeeder::Target& target, const uint64_t& due) : _target(target), _due(due) {}
     void setTime(uint64_t) override {}  // the service stamps events with its own clock
     void setState(const std::string& key, PropertyValue value) override { _target.applySetting(key, value); }
-    void handleInputReport(const uint8_t* bytes, size_t length) override { _target.writeReport(bytes, length); }
+    void handleInputReport(const uint8_t* bytes, size_t length) override { _target.writeReport(bytes, length, _due); }
 
 private:
     SimulationFeeder::Target& _target;
+    const uint64_t& _due;
 };
 }  // namespace
 
-// The frames of either form, a frame at a time: only the frames stay in memory, never the text.
-std::unique_ptr<PipelineRecording> SimulationFeeder::readFrames(const std::string& path) {
-    auto reader = RecordingFrameReader::openFile(path);
-    auto recording = std::make_unique<PipelineRecording>();
-    PipelineRecording::Frame frame;
-    while (reader->next(frame)) recording->appendFrame(std::move(frame));
-    return recording;
-}
-
 SimulationFeeder::SimulationFeeder(const std::string& path, float speed) : _path(path), _speed(speed) {
     try {
-        _recording = readFrames(path);
+        _reader = RecordingFrameReader::openFile(path, {}, RecordingFrameReader::Reading::AsItComes);
+        _hasFrame = _reader->next(_frame);
     } catch (const std::system_error& error) {
         throw std::runtime_error("cannot read the recording " + path + ": " + error.code().message());
     } catch (const std::exception& error) {
         throw std::runtime_error("the recording " + path + " cannot be played: " + error.what());
     }
+    _framesRead = _hasFrame ? 1 : 0;
 }
 
 SimulationFeeder::~SimulationFeeder() {
@@ -54,12 +46,15 @@ SimulationFeeder::~SimulationFeeder() {
 }
 
 void SimulationFeeder::start(Target target) {
-    _recording->clock.sleepMicroseconds = [this](uint64_t microseconds) { pause(microseconds); };
     _thread = std::thread([this, target = std::move(target)]() mutable { run(std::move(target)); });
 }
 
 void SimulationFeeder::requestStop() {
-    _stopping = true;
+    {
+        std::lock_guard lock(_mutex);
+        _stopping = true;
+    }
+    _stopChanged.notify_all();
 }
 
 void SimulationFeeder::stop() {
@@ -67,30 +62,54 @@ void SimulationFeeder::stop() {
     if (_thread.joinable()) _thread.join();
 }
 
-// Plain sleeps, the cheapest wait there is (at 125 reports a second the daemon's own cost is
-// mostly wake-ups), in slices short enough that a stop request is seen within kStopLatency.
+// No sleep per report: the due time moves on, and the thread waits only when it is kLead ahead,
+// then until it may write kBatch more. A stop request ends the wait at once.
 void SimulationFeeder::pause(uint64_t microseconds) {
-    constexpr uint64_t kStopLatencyNs = 50'000'000;
     // A gap of a day or more in a recording is a broken clock, not a pause worth keeping.
     constexpr uint64_t kLongestPause = 86'400'000'000;
-    timespec now{};
-    ::clock_gettime(CLOCK_MONOTONIC, &now);
-    uint64_t start = static_cast<uint64_t>(now.tv_sec) * 1'000'000'000 + static_cast<uint64_t>(now.tv_nsec);
-    uint64_t deadline = start + std::min(microseconds, kLongestPause) * 1000;
-    for (uint64_t wake = start; !_stopping && wake < deadline;) {
-        wake = std::min(deadline, wake + kStopLatencyNs);
-        timespec until{static_cast<time_t>(wake / 1'000'000'000), static_cast<long>(wake % 1'000'000'000)};
-        while (::clock_nanosleep(CLOCK_MONOTONIC, TIMER_ABSTIME, &until, nullptr) == EINTR) {
-        }
+    _due += std::min(microseconds, kLongestPause) * 1000;
+    const auto lead = static_cast<uint64_t>(kLead.count());
+    if (_due <= nowNanoseconds() + lead) return;
+    const Clock::time_point wake{std::chrono::nanoseconds(_due - lead + static_cast<uint64_t>(kBatch.count()))};
+    std::unique_lock lock(_mutex);
+    _stopChanged.wait_until(lock, wake, [this] { return _stopping.load(); });
+}
+
+std::string SimulationFeeder::cannotBePlayed(const std::exception& error) const {
+    std::string message = "the recording " + _path + " cannot be played after " + std::to_string(_framesRead) +
+                          (_framesRead == 1 ? " frame: " : " frames: ") + error.what();
+    if (const auto* read = dynamic_cast<const RecordingReadError*>(&error); read != nullptr && !read->detail().empty()) {
+        message += " (" + read->detail() + ")";
     }
+    return message;
+}
+
+// The frame after the one played; false at the end, or after telling the target it does not read.
+bool SimulationFeeder::readNext(const Target& target) {
+    try {
+        _hasFrame = _reader->next(_frame);
+    } catch (const std::system_error& error) {
+        if (target.failed) target.failed("cannot read the recording " + _path + ": " + error.code().message());
+        return false;
+    } catch (const std::exception& error) {
+        if (target.failed) target.failed(cannotBePlayed(error));
+        return false;
+    }
+    if (_hasFrame) ++_framesRead;
+    return true;
 }
 
 void SimulationFeeder::run(Target target) {
-    auto input = std::make_shared<FeederInput>(target);
-    _recording->pipeline = input;
-    _recording->playReset();
-    while (!_stopping && _recording->playCanContinue()) _recording->playNextFrame(_speed);
-    _recording->pipeline.reset();
+    PipelineRecording playback;
+    playback.pipeline = std::make_shared<FeederInput>(target, _due);
+    playback.clock.sleepMicroseconds = [this](uint64_t microseconds) { pause(microseconds); };
+    playback.playReset();
+    _due = nowNanoseconds();
+    while (_hasFrame && !_stopping) {
+        playback.playFrame(_frame, _speed);
+        if (!readNext(target)) return;
+    }
+    _reader.reset();  // the document is closed before the daemon's work ends
     if (!_stopping) target.finished();
 }
 

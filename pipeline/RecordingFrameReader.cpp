@@ -22,7 +22,10 @@ namespace {
 using Frame = PipelineRecording::Frame;
 
 constexpr size_t kChunk = 1 << 20;
-// Documents up to this size are read whole; longer ones as their frames are asked for.
+// Read as it comes: the pieces, and so the windows, are this long (a longer line or frame grows them).
+constexpr size_t kSmallChunk = 64 << 10;
+// Documents up to this size are read whole (unless read as they come); longer ones as their
+// frames are asked for.
 constexpr size_t kWholeDocument = 8 << 20;
 
 RecordingReadError::Kind kindOf(const std::exception& error) {
@@ -330,7 +333,8 @@ size_t framesArrayStart(const char* text, size_t size) {
 
 }  // namespace
 
-std::unique_ptr<RecordingFrameReader> RecordingFrameReader::openFile(const std::string& path, Warning onWarning) {
+std::unique_ptr<RecordingFrameReader> RecordingFrameReader::openFile(const std::string& path, Warning onWarning,
+                                                                    Reading reading) {
     std::unique_ptr<Source> source;
     if (path == "-") {
         source = std::make_unique<Source>(STDIN_FILENO, false);
@@ -340,14 +344,15 @@ std::unique_ptr<RecordingFrameReader> RecordingFrameReader::openFile(const std::
         source = std::make_unique<Source>(fd, true);
     }
     std::unique_ptr<RecordingFrameReader> reader(new RecordingFrameReader(std::move(source), std::move(onWarning)));
-    reader->start();
+    reader->start(reading);
     return reader;
 }
 
-std::unique_ptr<RecordingFrameReader> RecordingFrameReader::fromBytes(std::vector<uint8_t> bytes, Warning onWarning) {
+std::unique_ptr<RecordingFrameReader> RecordingFrameReader::fromBytes(std::vector<uint8_t> bytes, Warning onWarning,
+                                                                     Reading reading) {
     std::unique_ptr<RecordingFrameReader> reader(
         new RecordingFrameReader(std::make_unique<Source>(std::move(bytes)), std::move(onWarning)));
-    reader->start();
+    reader->start(reading);
     return reader;
 }
 
@@ -357,10 +362,11 @@ RecordingFrameReader::RecordingFrameReader(std::unique_ptr<Source> source, Warni
 RecordingFrameReader::~RecordingFrameReader() = default;
 
 // Reads the first line (or the first chunk) to tell the forms apart.
-void RecordingFrameReader::start() {
-    _buffer.resize(kChunk + simdjson::SIMDJSON_PADDING);
-    while (!_eof && _end < kChunk && std::memchr(_buffer.data(), '\n', _end) == nullptr) {
-        const size_t count = _source->read(_buffer.data() + _end, kChunk - _end);
+void RecordingFrameReader::start(Reading reading) {
+    const size_t chunk = reading == Reading::AsItComes ? kSmallChunk : kChunk;
+    _buffer.resize(chunk + simdjson::SIMDJSON_PADDING);
+    while (!_eof && _end < chunk && std::memchr(_buffer.data(), '\n', _end) == nullptr) {
+        const size_t count = _source->read(_buffer.data() + _end, chunk - _end);
         if (count == 0) _eof = true;
         _end += count;
     }
@@ -388,14 +394,15 @@ void RecordingFrameReader::start() {
 
     // The document form. Up to kWholeDocument it is read whole, so an error anywhere in it is
     // found before any frame is handed out; a longer one in the writer's layout is read as it is
-    // asked for.
-    while (!_eof && _end < kWholeDocument) {
+    // asked for, and so is any one read as it comes, however short (its first piece shows the layout).
+    const size_t whole = reading == Reading::AsItComes ? chunk : kWholeDocument;
+    while (!_eof && _end < whole) {
         if (_end == _buffer.size() - simdjson::SIMDJSON_PADDING) _buffer.resize(2 * _end + simdjson::SIMDJSON_PADDING);
         const size_t count = _source->read(_buffer.data() + _end, _buffer.size() - simdjson::SIMDJSON_PADDING - _end);
         if (count == 0) _eof = true;
         _end += count;
     }
-    if (!_eof) {
+    if (!_eof || reading == Reading::AsItComes) {
         if (const size_t arrayStart = framesArrayStart(_buffer.data(), _end); arrayStart != 0) {
             _stream = std::make_unique<DocumentStream>(*_source, std::move(_buffer), _end, arrayStart);
             return;

@@ -3,6 +3,11 @@
 // bytes, in either form (the JSON document or the line-per-report form, told apart by the
 // header line's "Format":"lines"). Replay, show, convert and the daemon's feeder read through it.
 //
+// How much is read ahead is the caller's choice (Reading): a document up to 8 MB whole, so that an
+// error anywhere in it is found before the first frame is handed out, or every document in the
+// writer's layout a frame at a time through a 64 KB window, however short, so that memory does not
+// grow with the document and the first frame comes at once (another layout is still read whole).
+//
 // The line form is read a line at a time. A last line without its newline that does not parse
 // (a recording cut off by a crash) is dropped with a warning; every complete line before it is
 // read. "Event" lines are kept apart (events()) for tools that compare, never played.
@@ -44,11 +49,17 @@ public:
         uint64_t timestamp = 0;
         std::string json;  // the event object's JSON text
     };
+    enum class Reading {
+        WholeWhenSmall,  // documents up to 8 MB are checked whole before their first frame
+        AsItComes,       // a frame at a time from the start, in small pieces
+    };
     using Warning = std::function<void(const std::string& message)>;
 
     // "-" reads standard input. Throws std::system_error when the file cannot be opened or read.
-    static std::unique_ptr<RecordingFrameReader> openFile(const std::string& path, Warning onWarning = {});
-    static std::unique_ptr<RecordingFrameReader> fromBytes(std::vector<uint8_t> bytes, Warning onWarning = {});
+    static std::unique_ptr<RecordingFrameReader> openFile(const std::string& path, Warning onWarning = {},
+                                                          Reading reading = Reading::WholeWhenSmall);
+    static std::unique_ptr<RecordingFrameReader> fromBytes(std::vector<uint8_t> bytes, Warning onWarning = {},
+                                                           Reading reading = Reading::WholeWhenSmall);
     ~RecordingFrameReader();
     RecordingFrameReader(const RecordingFrameReader&) = delete;
     RecordingFrameReader& operator=(const RecordingFrameReader&) = delete;
@@ -69,7 +80,7 @@ private:
     class Source;
     class DocumentStream;
     RecordingFrameReader(std::unique_ptr<Source> source, Warning onWarning);
-    void start();
+    void start(Reading reading);
     bool nextLine(PipelineRecording::Frame& frame);
     bool readLine(std::string_view& line, bool& complete);
 

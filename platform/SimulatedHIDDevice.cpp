@@ -1,6 +1,8 @@
 #include "platform/SimulatedHIDDevice.h"
 
 #include <sys/eventfd.h>
+#include <sys/timerfd.h>
+#include <time.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -10,39 +12,54 @@
 
 namespace TolkaTouch {
 
-std::shared_ptr<SimulatedHIDDevice> SimulatedHIDDevice::create(PropertyValue::Dictionary properties) {
+namespace {
+uint64_t monotonicNanoseconds() {
+    timespec now{};
+    ::clock_gettime(CLOCK_MONOTONIC, &now);
+    return static_cast<uint64_t>(now.tv_sec) * 1'000'000'000 + static_cast<uint64_t>(now.tv_nsec);
+}
+}  // namespace
+
+std::shared_ptr<SimulatedHIDDevice> SimulatedHIDDevice::create(PropertyValue::Dictionary properties,
+                                                               Delivery delivery) {
     // Semaphore mode: each read takes one count, so the descriptor stays readable while reports wait.
-    const int eventFd = eventfd(0, EFD_SEMAPHORE | EFD_NONBLOCK | EFD_CLOEXEC);
-    if (eventFd < 0) {
+    const int inputFd = delivery == Delivery::AtOnce ? eventfd(0, EFD_SEMAPHORE | EFD_NONBLOCK | EFD_CLOEXEC)
+                                                     : timerfd_create(CLOCK_MONOTONIC, TFD_NONBLOCK | TFD_CLOEXEC);
+    if (inputFd < 0) {
         return nullptr;
     }
-    return std::shared_ptr<SimulatedHIDDevice>(new SimulatedHIDDevice(eventFd, std::move(properties)));
+    return std::shared_ptr<SimulatedHIDDevice>(new SimulatedHIDDevice(inputFd, delivery, std::move(properties)));
 }
 
-SimulatedHIDDevice::SimulatedHIDDevice(int eventFd, PropertyValue::Dictionary properties)
-    : _eventFd(eventFd), _deviceProperties(std::move(properties)) {}
+SimulatedHIDDevice::SimulatedHIDDevice(int inputFd, Delivery delivery, PropertyValue::Dictionary properties)
+    : _inputFd(inputFd), _delivery(delivery), _deviceProperties(std::move(properties)) {}
 
 SimulatedHIDDevice::~SimulatedHIDDevice() {
     unscheduleAll();
-    ::close(_eventFd);
+    ::close(_inputFd);
 }
 
-bool SimulatedHIDDevice::writeInputReport(const uint8_t* bytes, size_t length) {
-    return writeInputReport(std::vector<uint8_t>(bytes, bytes + (bytes ? length : 0)));
+bool SimulatedHIDDevice::writeInputReport(const uint8_t* bytes, size_t length, uint64_t due) {
+    return writeInputReport(std::vector<uint8_t>(bytes, bytes + (bytes ? length : 0)), due);
 }
 
-bool SimulatedHIDDevice::writeInputReport(std::vector<uint8_t> bytes) {
+bool SimulatedHIDDevice::writeInputReport(std::vector<uint8_t> bytes, uint64_t due) {
     {
         std::lock_guard lock(_mutex);
         if (_ended) {
             return false;
         }
-        _reports.push_back(std::move(bytes));
+        _reports.push_back(Waiting{std::move(bytes), due});
+        if (_delivery == Delivery::AtDueTime) {
+            // The timer is set for the first waiting report only; a later one's turn comes after it.
+            if (_reports.size() == 1) setTimerLocked(due);
+            return true;
+        }
     }
     // Counted after the report is queued and outside the lock, so the woken reader finds the
     // report and does not have to wait for the writer to let go of the lock.
     const uint64_t one = 1;
-    [[maybe_unused]] const ssize_t written = ::write(_eventFd, &one, sizeof one);
+    [[maybe_unused]] const ssize_t written = ::write(_inputFd, &one, sizeof one);
     return true;
 }
 
@@ -52,9 +69,48 @@ void SimulatedHIDDevice::simulateRemoval() {
         return;
     }
     _ended = true;
+    if (_delivery == Delivery::AtDueTime) {
+        // The end is read once the last report is: at once when none waits.
+        if (_reports.empty()) setTimerLocked(0);
+        return;
+    }
     // One more count than reports: the read that finds the queue empty reports the end.
     const uint64_t one = 1;
-    [[maybe_unused]] const ssize_t written = ::write(_eventFd, &one, sizeof one);
+    [[maybe_unused]] const ssize_t written = ::write(_inputFd, &one, sizeof one);
+}
+
+// The timer fires at `due` (at once when that has passed); setting it forgets earlier firings.
+void SimulatedHIDDevice::setTimerLocked(uint64_t due) {
+    due = std::max<uint64_t>(due, 1);  // zero would disarm it
+    const itimerspec timer{{0, 0}, {static_cast<time_t>(due / 1'000'000'000), static_cast<long>(due % 1'000'000'000)}};
+    ::timerfd_settime(_inputFd, TFD_TIMER_ABSTIME, &timer, nullptr);
+}
+
+// One report whose time has come, then the timer set for the next one; under the lock, so the
+// timer always stands for the first waiting report when the lock is let go.
+HIDDeviceBase::ReadOutcome SimulatedHIDDevice::readDueReport(uint8_t* buffer, size_t capacity) {
+    std::lock_guard lock(_mutex);
+    uint64_t firings = 0;
+    [[maybe_unused]] const ssize_t got = ::read(_inputFd, &firings, sizeof firings);
+    if (_reports.empty()) {
+        return {_ended ? ReadStatus::Gone : ReadStatus::NothingToRead};
+    }
+    if (_reports.front().due > monotonicNanoseconds()) {
+        setTimerLocked(_reports.front().due);
+        return {ReadStatus::NothingToRead};
+    }
+    const std::vector<uint8_t> report = std::move(_reports.front().bytes);
+    _reports.pop_front();
+    if (!_reports.empty()) {
+        setTimerLocked(_reports.front().due);
+    } else if (_ended) {
+        setTimerLocked(0);
+    }
+    const size_t length = std::min(report.size(), capacity);
+    if (length > 0) {
+        std::memcpy(buffer, report.data(), length);
+    }
+    return {ReadStatus::Report, length};
 }
 
 size_t SimulatedHIDDevice::pendingInputReportCount() const {
@@ -63,15 +119,18 @@ size_t SimulatedHIDDevice::pendingInputReportCount() const {
 }
 
 HIDDeviceBase::ReadOutcome SimulatedHIDDevice::readInputReport(uint8_t* buffer, size_t capacity) {
+    if (_delivery == Delivery::AtDueTime) {
+        return readDueReport(buffer, capacity);
+    }
     std::lock_guard lock(_mutex);
     uint64_t count = 0;
-    if (::read(_eventFd, &count, sizeof count) != static_cast<ssize_t>(sizeof count)) {
+    if (::read(_inputFd, &count, sizeof count) != static_cast<ssize_t>(sizeof count)) {
         return {ReadStatus::NothingToRead};
     }
     if (_reports.empty()) {
         return {_ended ? ReadStatus::Gone : ReadStatus::NothingToRead};
     }
-    const std::vector<uint8_t> report = std::move(_reports.front());
+    const std::vector<uint8_t> report = std::move(_reports.front().bytes);
     _reports.pop_front();
     // Like a datagram read: what does not fit in the buffer is lost.
     const size_t length = std::min(report.size(), capacity);

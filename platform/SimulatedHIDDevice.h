@@ -3,8 +3,11 @@
 // thread, and delivered on the run loop like a real device's. Feature reports, per-report failures
 // and device properties are set up by the caller; calls into the handle are counted for tests.
 //
-// Written reports wait in an unbounded queue signalled through a semaphore-mode eventfd, so that
-// each write is exactly one report (zero-length ones included) and a writer never blocks.
+// Written reports wait in an unbounded queue, so that each write is exactly one report (zero-length
+// ones included) and a writer never blocks. Delivered at once, they are signalled through a
+// semaphore-mode eventfd; delivered at their due times, through a timer set for the first waiting
+// report, so that a writer may queue reports ahead of their time and each report costs the reading
+// thread one wake-up and the writer none, as a real surface's report costs one read.
 
 #include <deque>
 #include <map>
@@ -16,13 +19,20 @@ namespace TolkaTouch {
 
 class SimulatedHIDDevice : public HIDDeviceBase {
 public:
-    // Null only when no eventfd can be made.
-    static std::shared_ptr<SimulatedHIDDevice> create(PropertyValue::Dictionary properties = {});
+    enum class Delivery {
+        AtOnce,     // a written report is readable at once
+        AtDueTime,  // a written report is readable from its due time on, in the order written
+    };
+
+    // Null only when no eventfd or timer can be made.
+    static std::shared_ptr<SimulatedHIDDevice> create(PropertyValue::Dictionary properties = {},
+                                                      Delivery delivery = Delivery::AtOnce);
     ~SimulatedHIDDevice() override;
 
-    // Queues one input report; false once the device was removed.
-    bool writeInputReport(std::vector<uint8_t> bytes);
-    bool writeInputReport(const uint8_t* bytes, size_t length);
+    // Queues one input report; false once the device was removed. `due` (CLOCK_MONOTONIC
+    // nanoseconds) is when a device delivering at due times hands it out; it is ignored otherwise.
+    bool writeInputReport(std::vector<uint8_t> bytes, uint64_t due = 0);
+    bool writeInputReport(const uint8_t* bytes, size_t length, uint64_t due = 0);
     // Ends the report stream: reports already written are still delivered, then the device is
     // removed (its sources go and the removal handler runs on the run loop's thread).
     void simulateRemoval();
@@ -63,19 +73,27 @@ public:
 
 protected:
     ReadOutcome readInputReport(uint8_t* buffer, size_t capacity) override;
-    int inputFileDescriptor() const override { return _eventFd; }
+    int inputFileDescriptor() const override { return _inputFd; }
     PropertyValue deviceProperty(std::string_view key) const override;
     bool reportsAreNumbered() const override { return _numbered.load(); }
     uint64_t readTimestamp() const override;
 
 private:
-    explicit SimulatedHIDDevice(int eventFd, PropertyValue::Dictionary properties);
+    struct Waiting {
+        std::vector<uint8_t> bytes;
+        uint64_t due = 0;
+    };
 
-    const int _eventFd;
+    SimulatedHIDDevice(int inputFd, Delivery delivery, PropertyValue::Dictionary properties);
+    ReadOutcome readDueReport(uint8_t* buffer, size_t capacity);
+    void setTimerLocked(uint64_t due);
+
+    const int _inputFd;  // an eventfd, or a timer for reports delivered at their due times
+    const Delivery _delivery;
     std::atomic<bool> _numbered{true};
 
     mutable std::mutex _mutex;
-    std::deque<std::vector<uint8_t>> _reports;
+    std::deque<Waiting> _reports;
     bool _ended = false;
     std::map<uint32_t, std::vector<uint8_t>> _featureReports;
     std::map<uint32_t, uint32_t> _failures;

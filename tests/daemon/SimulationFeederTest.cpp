@@ -30,9 +30,10 @@ protected:
 
     SimulationFeeder::Target target() {
         SimulationFeeder::Target result;
-        result.writeReport = [this](const uint8_t* bytes, size_t length) {
+        result.writeReport = [this](const uint8_t* bytes, size_t length, uint64_t due) {
             std::lock_guard lock(mutex);
             calls.push_back("report " + std::to_string(length) + " " + std::to_string(bytes[0]));
+            dues.push_back(due);
         };
         result.applySetting = [this](const std::string& key, const PropertyValue& value) {
             std::lock_guard lock(mutex);
@@ -43,20 +44,34 @@ protected:
             finished = true;
             changed.notify_all();
         };
+        result.failed = [this](const std::string& message) {
+            std::lock_guard lock(mutex);
+            failure = message;
+            changed.notify_all();
+        };
         return result;
+    }
+
+    // Plays the document at `path` to its end or its failure.
+    void play(const std::string& path, float speed = 1.0f) {
+        SimulationFeeder feeder(path, speed);
+        feeder.start(target());
+        std::unique_lock lock(mutex);
+        changed.wait(lock, [this] { return finished || !failure.empty(); });
     }
 
     std::string directory;
     std::mutex mutex;
     std::condition_variable changed;
     std::vector<std::string> calls;
+    std::vector<uint64_t> dues;
     bool finished = false;
+    std::string failure;
 };
 
 TEST_F(SimulationFeederTest, AStateValueNestedAHundredThousandDeepIsRefusedWithoutRecursion) {
     const std::string deep = std::string(100000, '[') + std::string(100000, ']');
     std::string path = write(R"({"Version": 1, "Frames": [
-        {"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 03 "},
         {"Type": "State", "Timestamp": 1500, "Key": "Algs.X", "Value": )" + deep + "}]}");
     try {
         SimulationFeeder feeder(path, 1.0f);
@@ -65,6 +80,19 @@ TEST_F(SimulationFeederTest, AStateValueNestedAHundredThousandDeepIsRefusedWitho
         EXPECT_EQ(std::string(error.what()),
                   "the recording " + path + " cannot be played: migrateSerializedContainer failed: invalid container");
     }
+}
+
+TEST_F(SimulationFeederTest, AStateValueNestedAHundredThousandDeepPartWayEndsThePlaybackThere) {
+    const std::string deep = std::string(100000, '[') + std::string(100000, ']');
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 03 "},
+        {"Type": "State", "Timestamp": 1500, "Key": "Algs.X", "Value": )" + deep + "}]}");
+    play(path);
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 3 1"}));
+    EXPECT_EQ(failure, "the recording " + path + " cannot be played after 1 frame: "
+                       "migrateSerializedContainer failed: invalid container (in frame 2, at byte 110: arrays and objects "
+                       "nested deeper than 512 levels)");
+    EXPECT_FALSE(finished);
 }
 
 TEST_F(SimulationFeederTest, FramesGoOutInOrderThenFinishedIsCalled) {
@@ -114,7 +142,7 @@ TEST_F(SimulationFeederTest, StopWhileASettingWaitsForItsReportsEndsTheWaitWitho
     uint64_t written = 0;  // the feeder's thread only
     bool waiting = false;
     SimulationFeeder::Target playing = target();
-    playing.writeReport = [&](const uint8_t* bytes, size_t length) {
+    playing.writeReport = [&](const uint8_t* bytes, size_t length, uint64_t) {
         if (device->writeInputReport(bytes, length)) ++written;
     };
     playing.applySetting = [&](const std::string& key, const PropertyValue& value) {
@@ -189,16 +217,85 @@ TEST_F(SimulationFeederTest, EmptyRecordingFinishesAtOnce) {
     EXPECT_TRUE(calls.empty());
 }
 
-TEST_F(SimulationFeederTest, BadFrameAfterGoodOnesGivesTheReadersMessage) {
+TEST_F(SimulationFeederTest, BadFirstFrameGivesTheReadersMessage) {
     std::string path = write(R"({"Version": 1, "Frames": [
-        {"Type": "InputReport", "Timestamp": 1, "Report": "01 "},
-        {"Type": "state", "Timestamp": 2, "Key": "Algs.X"}]})");
+        {"Type": "state", "Timestamp": 2, "Key": "Algs.X"},
+        {"Type": "InputReport", "Timestamp": 1, "Report": "01 "}]})");
     try {
         SimulationFeeder feeder(path, 1.0f);
         FAIL();
     } catch (const std::runtime_error& error) {
         EXPECT_EQ(std::string(error.what()), "the recording " + path + " cannot be played: invalid frame type");
     }
+}
+
+TEST_F(SimulationFeederTest, BadFrameAfterGoodOnesIsPlayedUpToAndNamedWithTheReadersMessage) {
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1, "Report": "01 "},
+        {"Type": "InputReport", "Timestamp": 2, "Report": "02 "},
+        {"Type": "state", "Timestamp": 3, "Key": "Algs.X"},
+        {"Type": "InputReport", "Timestamp": 4, "Report": "03 "}]})");
+    play(path);
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 1 1", "report 1 2"}));
+    EXPECT_EQ(failure, "the recording " + path + " cannot be played after 2 frames: invalid frame type (in frame 3, at byte 167)");
+    EXPECT_FALSE(finished);
+}
+
+TEST_F(SimulationFeederTest, BadLinePartWayInTheLineFormIsNamedByItsLineNumber) {
+    std::string path = write(R"({"Version": 1, "Format": "lines"}
+{"Type": "InputReport", "Timestamp": 1, "Report": "01 "}
+{"Type": "InputReport", "Timestamp": 2, "Report": "02 
+{"Type": "InputReport", "Timestamp": 3, "Report": "03 "}
+)");
+    play(path);
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 1 1"}));
+    EXPECT_EQ(failure, "the recording " + path + " cannot be played after 1 frame: migrateSerializedContainer failed: "
+                       "invalid container (line 3, column 55: syntax error while parsing value - invalid string: missing "
+                       "closing quote, last read: '\"02 ')");
+}
+
+TEST_F(SimulationFeederTest, LineFormPlaysItsReportsAndSettings) {
+    std::string path = write(R"({"Version": 1, "Format": "lines"}
+{"Type": "InputReport", "Timestamp": 1000, "Report": "01 02 "}
+{"Type": "State", "Timestamp": 1500, "Key": "Algs.HoldTimeoutMilliseconds", "Value": 650}
+{"Type": "InputReport", "Timestamp": 2000, "Report": "02 "}
+)");
+    play(path);
+    EXPECT_EQ(calls, (std::vector<std::string>{"report 2 1", "set Algs.HoldTimeoutMilliseconds 650", "report 1 2"}));
+    EXPECT_TRUE(finished);
+}
+
+// Only the first frame is read before playing: a document whose frame far on does not read is
+// taken, and plays up to that frame.
+TEST_F(SimulationFeederTest, OnlyTheFirstFrameIsReadBeforeThePlaybackStarts) {
+    std::string text = "{\"Version\": 1, \"Frames\": [\n";
+    for (int frame = 0; frame < 5000; ++frame) {
+        text += "{\"Type\": \"InputReport\", \"Timestamp\": " + std::to_string(frame) + ", \"Report\": \"01 \"},\n";
+    }
+    text += "{\"Type\": \"Nothing\", \"Timestamp\": 5000}]}";
+    const std::string path = write(text);
+    SimulationFeeder feeder(path, 1000.0f);
+    feeder.start(target());
+    std::unique_lock lock(mutex);
+    changed.wait(lock, [this] { return finished || !failure.empty(); });
+    EXPECT_EQ(calls.size(), 5000u);
+    EXPECT_EQ(failure, "the recording " + path + " cannot be played after 5000 frames: invalid frame type "
+                       "(in frame 5001, at byte " + std::to_string(text.rfind('{')) + ")");
+}
+
+// The device hands each report out at its due time: the recorded gaps, divided by the speed.
+TEST_F(SimulationFeederTest, ReportsAreDueAtTheRecordedGapsDividedByTheSpeed) {
+    std::string path = write(R"({"Version": 1, "Frames": [
+        {"Type": "InputReport", "Timestamp": 1000000, "Report": "01 "},
+        {"Type": "State", "Timestamp": 1500000, "Key": "Algs.HoldTimeoutMilliseconds", "Value": 700},
+        {"Type": "InputReport", "Timestamp": 9000000, "Report": "02 "},
+        {"Type": "InputReport", "Timestamp": 9000000, "Report": "03 "},
+        {"Type": "InputReport", "Timestamp": 13000500, "Report": "04 "}]})");
+    play(path, 2.0f);
+    ASSERT_EQ(dues.size(), 4u);
+    EXPECT_EQ(dues[1] - dues[0], 4'000'000u);
+    EXPECT_EQ(dues[2] - dues[1], 0u);
+    EXPECT_EQ(dues[3] - dues[2], 2'000'000u);  // 2000.25 microseconds, cut to whole ones
 }
 
 TEST_F(SimulationFeederTest, TextThatIsNotJsonGivesTheReadersMessage) {
