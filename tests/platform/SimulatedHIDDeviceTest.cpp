@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <time.h>
+
 #include <thread>
 #include <vector>
 
@@ -48,13 +50,14 @@ struct Receiver {
 };
 
 struct OpenDevice {
-    std::shared_ptr<SimulatedHIDDevice> device = SimulatedHIDDevice::create();
+    std::shared_ptr<SimulatedHIDDevice> device;
     std::shared_ptr<RunLoop> loop = RunLoop::current();
     uint8_t buffer[512] = {};
     Receiver receiver;
     uint64_t clock = 1000;
 
-    OpenDevice() {
+    explicit OpenDevice(SimulatedHIDDevice::Delivery delivery = SimulatedHIDDevice::Delivery::AtOnce)
+        : device(SimulatedHIDDevice::create({}, delivery)) {
         device->setTimestampSource([this] { return clock++; });
         EXPECT_EQ(device->open(0), HIDResult::Success);
         device->registerInputReportCallback(buffer, sizeof buffer, Receiver::callback, &receiver);
@@ -229,6 +232,70 @@ TEST(SimulatedHIDDeviceTest, RemovalDeliversWaitingReportsThenCallsTheHandlerOnc
     // A removed device cannot be scheduled again.
     fixture.device->scheduleWithRunLoop(*fixture.loop, kMode);
     EXPECT_EQ(fixture.loop->runInMode(kMode, kGenerousSeconds, false), RunResult::Finished);
+}
+
+// CLOCK_MONOTONIC nanoseconds, the clock of due times.
+uint64_t monotonicNow() {
+    timespec now{};
+    ::clock_gettime(CLOCK_MONOTONIC, &now);
+    return static_cast<uint64_t>(now.tv_sec) * 1'000'000'000 + static_cast<uint64_t>(now.tv_nsec);
+}
+
+TEST(SimulatedHIDDeviceTest, ReportsPastTheirDueTimeArriveInTheOrderWritten) {
+    OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
+    ASSERT_TRUE(fixture.device->writeInputReport(Bytes{0x01, 0xAA}, 5));
+    ASSERT_TRUE(fixture.device->writeInputReport(Bytes{0x02}, 0));
+    ASSERT_TRUE(fixture.device->writeInputReport(Bytes{0x01, 1, 2}, monotonicNow()));
+    for (int index = 0; index < 3; ++index) {
+        EXPECT_EQ(fixture.runOnce(), RunResult::HandledSource);
+    }
+    EXPECT_EQ(fixture.loop->runInMode(kMode, 0.0, true), RunResult::TimedOut);
+    ASSERT_EQ(fixture.receiver.reports.size(), 3u);
+    EXPECT_EQ(fixture.receiver.reports[0].bytes, (Bytes{0x01, 0xAA}));
+    EXPECT_EQ(fixture.receiver.reports[1].bytes, (Bytes{0x02}));
+    EXPECT_EQ(fixture.receiver.reports[2].bytes, (Bytes{0x01, 1, 2}));
+}
+
+TEST(SimulatedHIDDeviceTest, ReportDueInAnHourWaitsAndHoldsBackTheReportsAfterIt) {
+    OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
+    ASSERT_TRUE(fixture.device->writeInputReport(Bytes{0x01}, monotonicNow() + 3'600'000'000'000));
+    ASSERT_TRUE(fixture.device->writeInputReport(Bytes{0x02}, 0));
+    EXPECT_EQ(fixture.loop->runInMode(kMode, 0.0, true), RunResult::TimedOut);
+    EXPECT_TRUE(fixture.receiver.reports.empty());
+    EXPECT_EQ(fixture.device->pendingInputReportCount(), 2u);
+}
+
+TEST(SimulatedHIDDeviceTest, DueReportWrittenFromAnotherThreadWakesAnEndlessRun) {
+    OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
+    std::thread writer([&] { fixture.device->writeInputReport(Bytes{0x01, 0x7F}, monotonicNow() + 1'000'000); });
+    EXPECT_EQ(fixture.loop->runInMode(kMode, RunLoop::kInfinite, true), RunResult::HandledSource);
+    writer.join();
+    ASSERT_EQ(fixture.receiver.reports.size(), 1u);
+    EXPECT_EQ(fixture.receiver.reports[0].bytes, (Bytes{0x01, 0x7F}));
+}
+
+TEST(SimulatedHIDDeviceTest, RemovalOfADeviceDeliveringAtDueTimesDeliversWaitingReportsFirst) {
+    OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
+    int removals = 0;
+    fixture.device->setRemovalHandler([&] { ++removals; });
+    fixture.device->writeInputReport(Bytes{0x01}, 0);
+    fixture.device->writeInputReport(Bytes{0x02}, monotonicNow() + 1'000'000);
+    fixture.device->simulateRemoval();
+    EXPECT_FALSE(fixture.device->writeInputReport(Bytes{0x03}, 0));
+    EXPECT_EQ(fixture.loop->runInMode(kMode, kGenerousSeconds, false), RunResult::Finished);
+    EXPECT_EQ(removals, 1);
+    ASSERT_EQ(fixture.receiver.reports.size(), 2u);
+    EXPECT_EQ(fixture.receiver.reports[1].bytes, Bytes{0x02});
+}
+
+TEST(SimulatedHIDDeviceTest, RemovalOfAnIdleDeviceDeliveringAtDueTimesIsReadAtOnce) {
+    OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
+    int removals = 0;
+    fixture.device->setRemovalHandler([&] { ++removals; });
+    fixture.device->simulateRemoval();
+    EXPECT_EQ(fixture.loop->runInMode(kMode, kGenerousSeconds, false), RunResult::Finished);
+    EXPECT_EQ(removals, 1);
+    EXPECT_TRUE(fixture.receiver.reports.empty());
 }
 
 TEST(SimulatedHIDDeviceTest, FeatureReportIsCopiedWithItsLength) {
