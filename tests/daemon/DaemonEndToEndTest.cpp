@@ -464,6 +464,20 @@ TEST_F(DaemonEndToEndTest, DocumentThatIsNotARecordingIsOneClearErrorLine) {
                                            "container version: 2\n");
 }
 
+TEST_F(DaemonEndToEndTest, DocumentThatStopsReadingPartWayIsPlayedUpToThereThenEndsWithOneErrorLineAndStatusOne) {
+    std::ofstream(file("cut.json")) << "{\"Version\": 1, \"Frames\": [\n"
+                                       "{\"Type\": \"InputReport\", \"Timestamp\": 1, \"Report\": \"01 \"},\n"
+                                       "{\"Type\": \"InputReport\", \"Timestamp\": 2, \"Report\": \"01 \"},\n"
+                                       "{\"Type\": \"state\", \"Timestamp\": 3}]}\n";
+    auto daemon = startDaemon(file("cut.json"), {"--no-keys"});
+    EXPECT_EQ(daemon->wait(10s), 1);
+    const std::string err = daemon->standardError();
+    const std::string line = "[error] Daemon: the recording " + file("cut.json") +
+                             " cannot be played after 2 frames: invalid frame type (in frame 3, at byte 143)\n";
+    EXPECT_NE(err.find(line), std::string::npos) << err;
+    EXPECT_NE(err.find("stopped serving simulated:" + file("cut.json")), std::string::npos) << err;
+}
+
 TEST_F(DaemonEndToEndTest, PluginThatCannotBeLoadedIsOneClearErrorLine) {
     auto daemon = std::make_unique<Subprocess>(
         std::vector<std::string>{TOLKATOUCHD_PATH, "--plugin", directory + "/none.so", "--socket", socket,
