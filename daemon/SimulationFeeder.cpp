@@ -4,9 +4,15 @@
 #include <stdexcept>
 #include <system_error>
 
+#include "pipeline/PipelineRecording.h"
 #include "pipeline/RecordingFrameReader.h"
 
 namespace TolkaTouch {
+
+struct SimulationFeeder::NextFrame {
+    PipelineRecording::Frame frame;
+    bool present = false;
+};
 
 namespace {
 using Clock = std::chrono::steady_clock;  // CLOCK_MONOTONIC, the device's timer's clock
@@ -29,16 +35,17 @@ private:
 };
 }  // namespace
 
-SimulationFeeder::SimulationFeeder(const std::string& path, float speed) : _path(path), _speed(speed) {
+SimulationFeeder::SimulationFeeder(const std::string& path, float speed)
+    : _path(path), _speed(speed), _next(std::make_unique<NextFrame>()) {
     try {
         _reader = RecordingFrameReader::openFile(path, {}, RecordingFrameReader::Reading::AsItComes);
-        _hasFrame = _reader->next(_frame);
+        _next->present = _reader->next(_next->frame);
     } catch (const std::system_error& error) {
         throw std::runtime_error("cannot read the recording " + path + ": " + error.code().message());
     } catch (const std::exception& error) {
         throw std::runtime_error("the recording " + path + " cannot be played: " + error.what());
     }
-    _framesRead = _hasFrame ? 1 : 0;
+    _framesRead = _next->present ? 1 : 0;
 }
 
 SimulationFeeder::~SimulationFeeder() {
@@ -87,7 +94,7 @@ std::string SimulationFeeder::cannotBePlayed(const std::exception& error) const 
 // The frame after the one played; false at the end, or after telling the target it does not read.
 bool SimulationFeeder::readNext(const Target& target) {
     try {
-        _hasFrame = _reader->next(_frame);
+        _next->present = _reader->next(_next->frame);
     } catch (const std::system_error& error) {
         if (target.failed) target.failed("cannot read the recording " + _path + ": " + error.code().message());
         return false;
@@ -95,7 +102,7 @@ bool SimulationFeeder::readNext(const Target& target) {
         if (target.failed) target.failed(cannotBePlayed(error));
         return false;
     }
-    if (_hasFrame) ++_framesRead;
+    if (_next->present) ++_framesRead;
     return true;
 }
 
@@ -105,8 +112,8 @@ void SimulationFeeder::run(Target target) {
     playback.clock.sleepMicroseconds = [this](uint64_t microseconds) { pause(microseconds); };
     playback.playReset();
     _due = nowNanoseconds();
-    while (_hasFrame && !_stopping) {
-        playback.playFrame(_frame, _speed);
+    while (_next->present && !_stopping) {
+        playback.playFrame(_next->frame, _speed);
         if (!readNext(target)) return;
     }
     _reader.reset();  // the document is closed before the daemon's work ends

@@ -25,7 +25,6 @@
 #include <string>
 #include <thread>
 
-#include "pipeline/PipelineRecording.h"
 #include "platform/PropertyValue.h"
 
 namespace TolkaTouch {
@@ -83,8 +82,8 @@ private:
     std::string _path;
     float _speed;
     std::unique_ptr<RecordingFrameReader> _reader;
-    PipelineRecording::Frame _frame;  // the next frame to play
-    bool _hasFrame = false;
+    struct NextFrame;  // the next frame to play, if any
+    std::unique_ptr<NextFrame> _next;
     uint64_t _framesRead = 0;
     uint64_t _due = 0;  // CLOCK_MONOTONIC nanoseconds at which the next report is due
     std::thread _thread;
