@@ -18,7 +18,8 @@ namespace {
 using Clock = std::chrono::steady_clock;  // CLOCK_MONOTONIC, the device's timer's clock
 
 uint64_t nowNanoseconds() {
-    return static_cast<uint64_t>(std::chrono::duration_cast<std::chrono::nanoseconds>(Clock::now().time_since_epoch()).count());
+    const auto sinceBoot = std::chrono::duration_cast<std::chrono::nanoseconds>(Clock::now().time_since_epoch());
+    return static_cast<uint64_t>(sinceBoot.count());
 }
 
 // The playback's downstream: reports go to the device with their due time, settings to the service.
@@ -85,9 +86,8 @@ void SimulationFeeder::pause(uint64_t microseconds) {
 std::string SimulationFeeder::cannotBePlayed(const std::exception& error) const {
     std::string message = "the recording " + _path + " cannot be played after " + std::to_string(_framesRead) +
                           (_framesRead == 1 ? " frame: " : " frames: ") + error.what();
-    if (const auto* read = dynamic_cast<const RecordingReadError*>(&error); read != nullptr && !read->detail().empty()) {
-        message += " (" + read->detail() + ")";
-    }
+    const auto* read = dynamic_cast<const RecordingReadError*>(&error);
+    if (read != nullptr && !read->detail().empty()) message += " (" + read->detail() + ")";
     return message;
 }
 
