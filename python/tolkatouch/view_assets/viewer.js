@@ -273,12 +273,15 @@
     });
   }
 
+  // Numbers as the served page has them (four decimals); a live snapshot carries the exact floats.
+  function shown(x) { return x === true ? "on" : x === false ? "-" : typeof x === "number" ? String(round(x, 4)) : x; }
+
   function describe(key, value) {
     if (Array.isArray(value) && value.length === info.pixels.length)
-      return value.map((x, i) => `${info.pixels[i]}=${x === true ? "on" : x === false ? "-" : x}`).join(" ");
+      return value.map((x, i) => `${info.pixels[i]}=${shown(x)}`).join(" ");
     if (Array.isArray(value) && value.length === info.virtual_groups.length)
-      return value.map((x, i) => `${info.virtual_groups[i]}=${x === true ? "on" : x === false ? "-" : x}`).join(" ");
-    return String(value);
+      return value.map((x, i) => `${info.virtual_groups[i]}=${shown(x)}`).join(" ");
+    return typeof value === "number" ? shown(value) : String(value);
   }
 
   function drawDetails() {
