@@ -164,6 +164,11 @@ def test_the_exported_page_opens_from_disk_with_no_request_out(browser, tmp_path
     open_page(browser, out.as_uri() + f"#frame={first + 5}")
     shown = pixel_numbers(browser)
     assert [shown[letter][0] for letter in tolkatouch.PIXEL_NAMES] == frames.readings[first + 5].tolist()
+    details = browser.execute_script(
+        "return Object.fromEntries([...document.querySelectorAll('#details tr')].map(r => [r.dataset.key, r.cells[1].textContent]))")
+    row = {name: getattr(frames, name)[first + 5] for name in frames.__dataclass_fields__}
+    lines = tolkatouch._tolkatouch.description_lines({k: v.tolist() if hasattr(v, "tolist") else v for k, v in row.items()})
+    assert (details["description"], details["virtual_description"]) == lines
 
 
 def test_the_live_page_shows_the_daemons_newest_frame_and_says_when_the_daemon_goes(browser, daemon_program, tmp_path):
