@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "algs/Descriptions.h"
+#include "algs/SnapshotDictionary.h"
 #include "common/Util.h"
 #include "tolkatouch/Gesture.h"
 
@@ -153,6 +154,8 @@ PropertyValue Algs::getState(const std::string& key) const {
     }
     if (key == "EventStats") return eventStats.statsDictionary();
     if (key == "DebugInfo") return PropertyValue(PropertyValue::Dictionary{{"EventStats", eventStats.statsDictionary()}});
+    // Every number of the last frame, for a host that follows the recognizer live.
+    if (key == "FrameSnapshot") return snapshotDictionary(snapshot());
     return PropertyValue();
 }
 

@@ -7,16 +7,25 @@
 namespace TolkaTouch {
 
 ContextHIDDevice::ContextHIDDevice(HIDDeviceRef inner, std::string node, uint32_t service,
-                                   std::shared_ptr<WatchHub> watch)
-    : WrappingHIDDevice(std::move(inner)), _node(std::move(node)), _service(service), _watch(std::move(watch)) {}
+                                   std::shared_ptr<WatchHub> watch, std::function<void()> afterFrame)
+    : WrappingHIDDevice(std::move(inner)),
+      _node(std::move(node)),
+      _service(service),
+      _watch(std::move(watch)),
+      _afterFrame(std::move(afterFrame)) {}
 
 void ContextHIDDevice::beforeInputReport(const uint8_t* report, size_t length) {
     if (_watch && _watch->active()) _watch->report(_service, report, length);
     LogContext logContext{_node, _service, std::nullopt};
-    if (auto image = InputReport::Image::parse(report, length)) logContext.frame = image->frameNumber;
+    const auto image = InputReport::Image::parse(report, length);
+    if (image) logContext.frame = image->frameNumber;
+    _handlingImage = image.has_value();
     SystemLog::setThreadContext(std::move(logContext));
 }
 
-void ContextHIDDevice::afterInputReport() { SystemLog::clearThreadContext(); }
+void ContextHIDDevice::afterInputReport() {
+    if (_handlingImage && _afterFrame) _afterFrame();
+    SystemLog::clearThreadContext();
+}
 
 }  // namespace TolkaTouch

@@ -96,6 +96,11 @@ std::string answerControlRequest(const std::string& line, ControlTarget& target)
         if (!target.startWatching()) return error("this daemon has nothing to watch");
         return dump(json{{"ok", true}});
     }
+    if (auto it = request.find("live"); it != request.end()) {
+        if (*it != true) return error("malformed request: \"live\" takes true");
+        if (!target.startLive()) return error("this daemon has no live frames to give");
+        return dump(json{{"ok", true}});
+    }
     if (auto it = request.find("devices"); it != request.end() && *it == true) {
         auto list = json::array();
         for (const auto& device : target.devices()) {

@@ -7,6 +7,8 @@
 //   {"log": CATEGORY, "level": L} -> {"ok": true}  (CATEGORY "*" for every category)
 //   {"watch": true}              -> {"ok": true}, then the daemon's live lines (WatchHub.h) until
 //                                   the client leaves; the debug level of "Algs" is on meanwhile
+//   {"live": true}               -> {"ok": true}, then {"frame": SNAPSHOT} lines (LiveFrames.h), at
+//                                   most 60 a second, the newest only for a slow reader
 // "get" and "set" may name a device with "device": N (its service number); without it they go to
 // the first device. Anything else gets {"error": MESSAGE}.
 
@@ -37,6 +39,8 @@ public:
                                             const PropertyValue& value) = 0;
     // Makes the asking client a subscriber of the live lines; false when there are none to give.
     virtual bool startWatching() { return false; }
+    // Makes the asking client a subscriber of the live frame snapshots; false when there are none.
+    virtual bool startLive() { return false; }
 };
 
 // One reply line (without its newline) for one request line.

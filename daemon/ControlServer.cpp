@@ -28,8 +28,10 @@ struct ControlServer::Client {
     std::string output;         // replies not yet written
     std::size_t outputOffset = 0;
     bool closing = false;  // the peer stopped writing; leave once the replies are out
-    bool subscribed = false;  // gets every pushed line
+    uint8_t channels = 0;     // the Channel bits it subscribes to
     uint64_t dropped = 0;     // pushed lines it had no room for, not yet told
+    std::string newest;       // the newest frame line, not yet in output (Frames)
+    bool subscribed(Channel channel) const { return channels & static_cast<uint8_t>(channel); }
 };
 
 namespace {
@@ -290,7 +292,7 @@ void ControlServer::takeFinishedTurns() {
     uint64_t count;
     [[maybe_unused]] ssize_t got = ::read(_wakeFd, &count, sizeof(count));
     std::vector<Turn> finished;
-    std::set<uint64_t> subscribers;
+    std::map<uint64_t, uint8_t> subscribers;
     {
         std::lock_guard lock(_turnsMutex);
         finished.swap(_finishedTurns);
@@ -303,7 +305,14 @@ void ControlServer::takeFinishedTurns() {
         Client& client = *it->second;
         // The reply that subscribed comes before the first pushed line.
         client.output += turn.replies;
-        if (subscribers.count(client.id)) client.subscribed = true;
+        if (auto asked = subscribers.find(client.id); asked != subscribers.end()) {
+            // A small send buffer keeps what a slow frame reader has not read yet to a few lines.
+            if ((asked->second & ~client.channels) & static_cast<uint8_t>(Channel::Frames)) {
+                const int size = kFrameSendBuffer;
+                ::setsockopt(client.fd, SOL_SOCKET, SO_SNDBUF, &size, sizeof(size));
+            }
+            client.channels |= asked->second;
+        }
         client.inTurn = false;
         serve(client);
     }
@@ -348,22 +357,36 @@ std::string ControlServer::answer(const Request& request) const {
 
 uint64_t ControlServer::currentClient() { return tCurrentClient; }
 
-void ControlServer::subscribe(uint64_t client) {
+void ControlServer::subscribe(uint64_t client, Channel channel) {
     if (client == 0) return;
     std::lock_guard lock(_turnsMutex);
-    _newSubscribers.insert(client);
+    _newSubscribers[client] |= static_cast<uint8_t>(channel);
 }
 
-std::size_t ControlServer::subscriberCount() const {
+std::size_t ControlServer::subscriberCount(Channel channel) const {
     std::size_t count = 0;
-    for (const auto& [fd, client] : _clients) count += client->subscribed && !client->closing;
+    for (const auto& [fd, client] : _clients) count += client->subscribed(channel) && !client->closing;
     return count;
+}
+
+void ControlServer::pushNewest(const std::string& line) {
+    std::vector<int> subscribers;
+    for (const auto& [fd, client] : _clients) {
+        if (client->subscribed(Channel::Frames)) subscribers.push_back(fd);
+    }
+    for (int fd : subscribers) {
+        Client& client = *_clients.at(fd);
+        // Replaces a line the client had no room for: it gets the newest, never a backlog.
+        client.newest = line;
+        client.newest += '\n';
+        writeTo(client);
+    }
 }
 
 void ControlServer::push(const std::vector<std::string>& lines) {
     std::vector<int> subscribers;
     for (const auto& [fd, client] : _clients) {
-        if (client->subscribed) subscribers.push_back(fd);
+        if (client->subscribed(Channel::Lines)) subscribers.push_back(fd);
     }
     for (int fd : subscribers) {
         Client& client = *_clients.at(fd);
@@ -386,19 +409,25 @@ void ControlServer::push(const std::vector<std::string>& lines) {
 }
 
 void ControlServer::writeTo(Client& client) {
-    while (client.outputOffset < client.output.size()) {
-        ssize_t sent = ::send(client.fd, client.output.data() + client.outputOffset,
-                              client.output.size() - client.outputOffset, MSG_NOSIGNAL);
-        if (sent < 0 && errno == EINTR) continue;
-        if (sent < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) return;
-        if (sent < 0) {
-            drop(client.fd);
-            return;
+    for (;;) {
+        while (client.outputOffset < client.output.size()) {
+            ssize_t sent = ::send(client.fd, client.output.data() + client.outputOffset,
+                                  client.output.size() - client.outputOffset, MSG_NOSIGNAL);
+            if (sent < 0 && errno == EINTR) continue;
+            if (sent < 0 && (errno == EAGAIN || errno == EWOULDBLOCK)) return;
+            if (sent < 0) {
+                drop(client.fd);
+                return;
+            }
+            client.outputOffset += static_cast<std::size_t>(sent);
         }
-        client.outputOffset += static_cast<std::size_t>(sent);
+        client.output.clear();
+        client.outputOffset = 0;
+        // The newest frame goes out only behind everything already on its way, so that a line
+        // being written is never replaced halfway.
+        if (client.newest.empty()) return;
+        client.output.swap(client.newest);
     }
-    client.output.clear();
-    client.outputOffset = 0;
 }
 
 void ControlServer::drop(int fd) {

@@ -7,7 +7,8 @@
 // writes half a line and leaves, or never reads its replies, costs a descriptor and a bounded
 // buffer, and never holds up the daemon. Lines longer than kMaxLineLength get an error reply, and
 // so does a request whose reply would be longer than kMaxReplyLength. Clients may subscribe to the
-// lines the daemon pushes (what `tolkatouch watch` follows).
+// lines the daemon pushes (what `tolkatouch watch` follows), or to the newest of a stream of
+// frames (what `tolkatouch view --live` follows), where a slow reader skips to the newest.
 
 #include <sys/types.h>
 
@@ -19,7 +20,6 @@
 #include <map>
 #include <memory>
 #include <mutex>
-#include <set>
 #include <string>
 #include <thread>
 #include <vector>
@@ -68,17 +68,23 @@ public:
     // The one-line reply that stands in for one longer than kMaxReplyLength.
     static std::string replyTooLong(std::size_t length);
 
-    // Subscribers: clients that, after their replies, get every line the daemon pushes. A
-    // subscriber whose unread lines pass kMaxSubscriberBacklog bytes loses the next ones, and is
-    // told how many ({"dropped": N}) before the first it gets again.
+    // Subscribers: clients that, after their replies, get what the daemon pushes on a channel.
+    // On Lines, every line: a subscriber whose unread lines pass kMaxSubscriberBacklog bytes loses
+    // the next ones, and is told how many ({"dropped": N}) before the first it gets again.
+    // On Frames, the newest line only: a line not yet on its way replaces the one before it, and
+    // the socket's send buffer is cut to kFrameSendBuffer, so a slow reader is never more than a
+    // few lines behind and gets the newest as soon as it reads again.
+    enum class Channel : uint8_t { Lines = 1, Frames = 2 };
     static constexpr std::size_t kMaxSubscriberBacklog = 1024 * 1024;
+    static constexpr int kFrameSendBuffer = 16 * 1024;
     // The client whose request this thread's handler is answering; 0 outside the handler.
     static uint64_t currentClient();
     // From the handler: the client becomes a subscriber once its reply is out (any thread).
-    void subscribe(uint64_t client);
+    void subscribe(uint64_t client, Channel channel = Channel::Lines);
     // From here on, the loop's side: who subscribes, and the lines they get.
-    std::size_t subscriberCount() const;
+    std::size_t subscriberCount(Channel channel = Channel::Lines) const;
     void push(const std::vector<std::string>& lines);
+    void pushNewest(const std::string& line);
 
 private:
     struct Client;
@@ -123,7 +129,8 @@ private:
     std::condition_variable _turnsReady;
     std::deque<Turn> _waitingTurns;   // in the order the clients became ready: round robin
     std::vector<Turn> _finishedTurns;
-    std::set<uint64_t> _newSubscribers;  // asked for by the handler, taken with the finished turns
+    // Asked for by the handler (client, channels), taken with the finished turns.
+    std::map<uint64_t, uint8_t> _newSubscribers;
     bool _stopping = false;
     std::vector<std::thread> _workers;
 };

@@ -19,6 +19,7 @@
 #include "daemon/DeviceDiscovery.h"
 #include "daemon/KeyLogOutput.h"
 #include "daemon/KeyMapper.h"
+#include "daemon/LiveFrames.h"
 #include "daemon/PluginInstance.h"
 #include "daemon/PluginLibrary.h"
 #include "daemon/Signals.h"
@@ -100,6 +101,7 @@ Daemon::Daemon(DaemonOptions options, std::FILE* printOutput)
     ::timerfd_settime(_logTimerFd, 0, &everySecond, nullptr);
 
     _watch = std::make_shared<WatchHub>();
+    _live = std::make_shared<LiveFrames>(monotonicNow);
     _loop = RunLoop::current();
     _eventQueue = DispatchQueue::create("tolkatouchd.events");
 }
@@ -150,6 +152,10 @@ void Daemon::addSources() {
     });
     _loop->addSource(_watch->pollFd(), kLoopMode, [this] {
         _control->push(_watch->take());
+        updateWatching();
+    });
+    _loop->addSource(_live->pollFd(), kLoopMode, [this] {
+        if (auto line = _live->take()) _control->pushNewest(*line);
         updateWatching();
     });
     if (_discovery) {
@@ -230,7 +236,9 @@ void Daemon::addDevice(std::string node, uint16_t vendor, uint16_t product, HIDD
     uint32_t service = _nextService++;
     // The service's start asks the registry for its device: it gets the handle opened here, which
     // names the device and the frame in every log line written while one of its reports is handled.
-    HIDDeviceRef logged = std::make_shared<ContextHIDDevice>(handle, node, service, _watch);
+    HIDDeviceRef logged = std::make_shared<ContextHIDDevice>(handle, node, service, _watch, [this, service] {
+        if (_live->due()) offerLiveFrame(service);
+    });
     HIDServiceRegistry::registerService(service, [logged] { return logged; });
     // Runs on the service's input report thread, which must not tear itself down: hand over.
     handle->setRemovalHandler([this, service] {
@@ -421,7 +429,22 @@ bool Daemon::startWatching() {
     return true;
 }
 
+bool Daemon::startLive() {
+    _control->subscribe(ControlServer::currentClient(), ControlServer::Channel::Frames);
+    return true;
+}
+
+// On the device's report thread, after a due frame: the plug-in answers the frame's snapshot under
+// its own lock, which the report thread has just let go; the hand-over waits for nobody.
+void Daemon::offerLiveFrame(uint32_t service) {
+    auto instance = findInstance(service);
+    if (!instance) return;
+    PropertyValue snapshot = instance->tryCopyProperty("Pipeline.Algs.FrameSnapshot");
+    if (snapshot.isDictionary()) _live->hand(service, std::move(snapshot));
+}
+
 void Daemon::updateWatching() {
+    _live->setActive(_control->subscriberCount(ControlServer::Channel::Frames) > 0);
     const bool watched = _control->subscriberCount() > 0;
     if (watched == _watching) return;
     if (!watched) {

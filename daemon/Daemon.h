@@ -30,6 +30,7 @@ class CountingHIDDevice;
 class DeviceDiscovery;
 class KeyMapper;
 class KeyOutput;
+class LiveFrames;
 class PluginInstance;
 class PluginLibrary;
 class RunLoop;
@@ -71,6 +72,7 @@ public:
     std::vector<ControlDeviceInfo> devices() override;
     std::optional<PropertyValue> getProperty(std::optional<uint32_t> service, const std::string& key) override;
     bool startWatching() override;
+    bool startLive() override;
     std::optional<bool> setProperty(std::optional<uint32_t> service, const std::string& key,
                                     const PropertyValue& value) override;
 
@@ -118,6 +120,9 @@ private:
     int _levelBeforeWatching = 0;
     // Turns the watched debug level and the live lines on or off as subscribers come and go.
     void updateWatching();
+    // `tolkatouch view --live`: the newest frame snapshots, taken on the report threads.
+    std::shared_ptr<LiveFrames> _live;
+    void offerLiveFrame(uint32_t service);
 
     // Changed only on the run loop, under the lock, which the control socket's workers take to
     // look a device up.

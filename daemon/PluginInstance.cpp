@@ -89,6 +89,12 @@ PropertyValue PluginInstance::copyProperty(const std::string& key) const {
     return (*_hidService)->copyProperty(_hidService, key.c_str());
 }
 
+PropertyValue PluginInstance::tryCopyProperty(const std::string& key) const {
+    std::shared_lock lock(_lifetime, std::try_to_lock);
+    if (!lock.owns_lock() || !_hidService) return PropertyValue();
+    return (*_hidService)->copyProperty(_hidService, key.c_str());
+}
+
 bool PluginInstance::setProperty(const std::string& key, const PropertyValue& value) {
     std::shared_lock lock(_lifetime);
     if (!_hidService) return false;

@@ -39,6 +39,9 @@ public:
     void shutdown();
 
     PropertyValue copyProperty(const std::string& key) const;
+    // As copyProperty, but null at once while the teardown holds the instance: for the service's
+    // own report thread, which the teardown waits for.
+    PropertyValue tryCopyProperty(const std::string& key) const;
     bool setProperty(const std::string& key, const PropertyValue& value);
 
 private:

@@ -24,10 +24,15 @@ struct ViewArguments {
     std::optional<std::string> exportPath;
     std::optional<double> from;
     std::optional<double> to;
+    bool live = false;
+    std::optional<std::string> socket;
 };
 
 [[noreturn]] void runView(const ViewArguments& arguments) {
-    std::vector<std::string> words{arguments.document};
+    std::vector<std::string> words;
+    if (!arguments.document.empty()) words.push_back(arguments.document);
+    if (arguments.live) words.emplace_back("--live");
+    if (arguments.socket) words.insert(words.end(), {"--socket", *arguments.socket});
     if (arguments.labels) words.insert(words.end(), {"--labels", *arguments.labels});
     for (const std::string& setting : arguments.settings) words.insert(words.end(), {"--set", setting});
     if (arguments.port) words.insert(words.end(), {"--port", std::to_string(*arguments.port)});
@@ -46,8 +51,10 @@ void addViewCommand(CLI::App& app) {
         "view",
         "See a recording in the browser: a zoomable timeline of every per-frame number, the surface at one frame with "
         "its snapshot, and what other settings would have done; served on 127.0.0.1 with a token in the URL, which is "
-        "the first line printed (needs the tolkatouch Python package).");
-    command->add_option("DOCUMENT", arguments->document, "Recording document to view")->required();
+        "the first line printed (needs the tolkatouch Python package). With --live, the running service instead: the "
+        "surface at its newest frame and the last 30 s of timeline.");
+    command->footer("Example: tolkatouch view --live   (follows the running tolkatouchd)");
+    command->add_option("DOCUMENT", arguments->document, "Recording document to view (not with --live)");
     command->add_option("--labels", arguments->labels, "Labels document (default: DOC.labels.json beside it)")
         ->type_name("FILE");
     command->add_option("--set", arguments->settings,
@@ -65,7 +72,17 @@ void addViewCommand(CLI::App& app) {
         ->type_name("FILE.html");
     command->add_option("--from", arguments->from, "With --export: first second, from the first frame")->type_name("S");
     command->add_option("--to", arguments->to, "With --export: last second, from the first frame")->type_name("S");
-    command->callback([arguments] { runView(*arguments); });
+    auto* live = command->add_flag("--live", arguments->live,
+                                   "Follow the running tolkatouchd: its newest frame's surface and snapshot and the last "
+                                   "30 s of timeline, at most 60 frames a second");
+    command->add_option("--socket", arguments->socket,
+                        "With --live: tolkatouchd's control socket (default: as tolkatouch watch)")
+        ->type_name("PATH")
+        ->needs(live);
+    command->callback([arguments] {
+        if (arguments->document.empty() && !arguments->live) throw CLI::RequiredError("DOCUMENT (or --live)");
+        runView(*arguments);
+    });
 }
 
 }  // namespace TolkaTouch::Tools

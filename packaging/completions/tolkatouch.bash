@@ -20,7 +20,7 @@ _tolkatouch() {
         tune) options="--trials --timeout --space --objective --max-false-activations-per-hour --pareto --heldout --seed --sampler --pruner --storage --study --jobs --tolerance --write-settings --plots --json --help" ;;
         plot-eval) options="--output --kind --setting --metric --point --help" ;;
         record) options="--output --device --vendor --product --duration --max-reports --rotate --with-events --socket --help" ;;
-        view) options="--labels --set --port --no-browser --export --from --to --help" ;;
+        view) options="--labels --set --port --no-browser --export --from --to --live --socket --help" ;;
         uhid) options="--destroy-after --feature --fail-report --wait-open --settle --linger --wait-signal --vendor --product --name --uhid --help" ;;
         keys) options="--name --wait --timeout --idle --count --help" ;;
         prop)

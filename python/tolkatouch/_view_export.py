@@ -9,10 +9,11 @@ from typing import Optional
 
 import numpy as np
 
+from . import _tolkatouch as _core
 from ._view_assets import asset_bytes
 from ._view_data import ViewData, event_rows
 
-#: The most frames an exported page carries (about 2.7 minutes at 125 frames a second, some 25 MB).
+#: The most frames an exported page carries (about 2.7 minutes at 125 frames a second, some 40 MB).
 EXPORT_MAX_FRAMES = 20_000
 
 
@@ -48,11 +49,15 @@ def export_data(data: ViewData, start: Optional[float], end: Optional[float]) ->
         timeline["events"] = event_rows(data.baseline, start, end)
     frames = data.baseline.frames
     columns = {}
+    exact = {}
     for name in frames.__dataclass_fields__:
         values = getattr(frames, name)[first:last]
-        if values.dtype.kind == "f":
-            values = np.round(values.astype(np.float64), 4)
-        columns[name] = values.tolist()
+        exact[name] = values.tolist()
+        columns[name] = np.round(values.astype(np.float64), 4).tolist() if values.dtype.kind == "f" else exact[name]
+    # The description lines, as the served page's details panel shows them: from the exact floats.
+    lines = [_core.description_lines({name: column[i] for name, column in exact.items()}) for i in range(count)]
+    columns["description"] = [touch for touch, _ in lines]
+    columns["virtual_description"] = [virtual for _, virtual in lines]
     from . import HOLD_CLOCK_NAMES, REGION_NAMES, TRANSITION_NAMES
     columns["transition_name"] = [TRANSITION_NAMES[c] if c < len(TRANSITION_NAMES) else "?" for c in frames.transition[first:last]]
     columns["hold_clock_name"] = [HOLD_CLOCK_NAMES[c] if c < len(HOLD_CLOCK_NAMES) else "?" for c in frames.hold_clock[first:last]]

@@ -2,11 +2,13 @@
 
     python3 -m tolkatouch.view RECORDING [--labels FILE] [--set KEY=VALUE]... [--port N] [--no-browser]
     python3 -m tolkatouch.view RECORDING --export FILE.html [--from S] [--to S]
+    python3 -m tolkatouch.view --live [--socket PATH] [--port N] [--no-browser]
 
 The page's first line on standard output is its URL. The page draws a timeline (pixel readings
 by zone, on flags, touch score, hand state, active region, events and labels) from level-of-detail
 views the server computes, the surface at one frame with every number of its snapshot, and what a
-settings change would have done. `tolkatouch view` runs this module.
+settings change would have done. With --live it follows the running daemon instead: the surface at
+its newest frame and the last 30 s of timeline. `tolkatouch view` runs this module.
 """
 
 from __future__ import annotations
@@ -29,6 +31,7 @@ from typing import Optional, Sequence
 from . import Error
 from ._view_assets import ASSETS, asset_bytes
 from ._view_data import MAX_COLUMNS, ViewData
+from ._view_live import LiveData, LiveError, default_socket_path
 from ._errors import error_lines, printable
 
 EXIT_FAILURE = 1
@@ -120,7 +123,10 @@ class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
             self._refuse(414, "query too long")
             return
         if rest in ("", "index.html"):
-            self._send(200, asset_bytes("index.html"), ASSETS["index.html"])
+            page = asset_bytes("index.html")
+            if isinstance(self.server.data, LiveData):
+                page = page.replace(b"<body>", b'<body class="live">', 1)
+            self._send(200, page, ASSETS["index.html"])
         elif rest.startswith("assets/") and rest[len("assets/"):] in ASSETS:
             name = rest[len("assets/"):]
             self._send(200, asset_bytes(name), ASSETS[name], cache=name == "plotly.js")
@@ -146,9 +152,15 @@ class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
         # "set=" alone asks for the defaults; no "set" at all, for the opening settings.
         settings = [item for item in query["set"] if item] if "set" in query else data.settings
         data.wait_ready()
+        live = isinstance(data, LiveData)
+        if live and name not in ("info", "live") or not live and name == "live":
+            self._refuse(404, "not found")
+            return
         try:
             if name == "info":
                 answer = data.info()
+            elif name == "live":
+                answer = data.live(number("after", 0, int))
             elif name == "timeline":
                 start = number("from", float("-inf"))
                 end = number("to", float("inf"))
@@ -176,8 +188,9 @@ class ViewRequestHandler(http.server.BaseHTTPRequestHandler):
         self._json(200, answer)
 
 
-def serve(data: ViewData, port: int = 0, open_browser: bool = True, out=sys.stdout) -> int:
-    """Serves the data until interrupted; data.prepare() runs here once the port is bound."""
+def serve(data, port: int = 0, open_browser: bool = True, out=sys.stdout) -> int:
+    """Serves the data (a ViewData or a LiveData) until interrupted; a ViewData's prepare() runs
+    here once the port is bound."""
     try:
         server = ViewServer(data, port)
     except OSError as error:
@@ -188,7 +201,8 @@ def serve(data: ViewData, port: int = 0, open_browser: bool = True, out=sys.stdo
         return EXIT_FAILURE
     print(server.url, file=out, flush=True)
     # The opening replay runs while the browser loads the page's scripts.
-    threading.Thread(target=data.prepare, daemon=True).start()
+    if isinstance(data, ViewData):
+        threading.Thread(target=data.prepare, daemon=True).start()
     signal.signal(signal.SIGTERM, lambda *_: threading.Thread(target=server.shutdown, daemon=True).start())
     if open_browser:
         webbrowser.open(server.url)
@@ -202,8 +216,11 @@ def serve(data: ViewData, port: int = 0, open_browser: bool = True, out=sys.stdo
 
 
 def arguments_parser(prog: Optional[str] = None) -> argparse.ArgumentParser:
-    parser = argparse.ArgumentParser(prog=prog, description="See a recording in the browser: timeline, surface, what if.")
-    parser.add_argument("recording", metavar="RECORDING", help="recording document (version 0 or 1)")
+    parser = argparse.ArgumentParser(
+        prog=prog, description="See a recording in the browser: timeline, surface, what if; or, with --live, the running "
+                               "service's newest frame and last 30 s.",
+        epilog="example: tolkatouch view --live --socket /run/tolkatouch/tolkatouchd.sock")
+    parser.add_argument("recording", metavar="RECORDING", nargs="?", help="recording document (version 0 or 1)")
     parser.add_argument("--labels", metavar="FILE", help="labels document (default: RECORDING's .labels.json beside it)")
     parser.add_argument("--set", dest="settings", action="append", default=[], metavar="KEY=VALUE",
                         help="a setting applied before the first frame, as replay --set takes it (repeatable)")
@@ -212,6 +229,11 @@ def arguments_parser(prog: Optional[str] = None) -> argparse.ArgumentParser:
     parser.add_argument("--export", metavar="FILE.html", help="write one self-contained page of a range and exit")
     parser.add_argument("--from", dest="start", type=float, metavar="S", help="with --export: first second")
     parser.add_argument("--to", dest="end", type=float, metavar="S", help="with --export: last second")
+    parser.add_argument("--live", action="store_true",
+                        help="follow the running tolkatouchd instead of a recording: the surface at its newest frame "
+                             "and the last 30 s of timeline, at most 60 frames a second")
+    parser.add_argument("--socket", metavar="PATH",
+                        help=f"with --live: tolkatouchd's control socket (default: {default_socket_path()})")
     return parser
 
 
@@ -220,6 +242,24 @@ def main(argv: Optional[Sequence[str]] = None, prog: Optional[str] = None) -> in
     arguments = parser.parse_args(argv)
     if not 0 <= arguments.port <= 65535:
         parser.error(f"--port must be from 0 to 65535, not {arguments.port}")
+    if arguments.live:
+        if arguments.recording is not None:
+            parser.error("--live follows the running daemon: give no RECORDING")
+        if arguments.labels or arguments.settings or arguments.export or arguments.start is not None or arguments.end is not None:
+            parser.error("--labels, --set, --export, --from and --to go with a RECORDING, not --live")
+        try:
+            data = LiveData.connect(arguments.socket or default_socket_path())
+        except LiveError as error:
+            print(f"tolkatouch: {error}", file=sys.stderr)
+            return EXIT_FAILURE
+        try:
+            return serve(data, arguments.port, not arguments.no_browser)
+        finally:
+            data.close()
+    if arguments.socket is not None:
+        parser.error("--socket goes with --live")
+    if arguments.recording is None:
+        parser.error("give a RECORDING, or --live")
     if (arguments.start is not None or arguments.end is not None) and not arguments.export:
         parser.error("--from and --to go with --export")
     if arguments.start is not None and arguments.end is not None and arguments.end <= arguments.start:

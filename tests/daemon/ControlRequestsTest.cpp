@@ -27,10 +27,16 @@ public:
         properties[key] = value;
         return key != "Refused";
     }
+    bool startLive() override {
+        ++liveAsked;
+        return hasLive;
+    }
 
     std::vector<ControlDeviceInfo> list{{1, "/dev/hidraw4", 0x1209, 0x0001}};
     std::map<std::string, PropertyValue> properties;
     std::vector<std::pair<std::optional<uint32_t>, std::string>> asked;
+    bool hasLive = true;
+    int liveAsked = 0;
 };
 
 TEST(ControlRequestsTest, GetAnswersTheServicesValue) {
@@ -147,6 +153,28 @@ TEST(ControlRequestsTest, AnObjectWithoutAKnownRequestIsUnknown) {
     FakeTarget target;
     EXPECT_EQ(answerControlRequest(R"({"reboot": true})", target), R"({"error":"unknown request"})");
     EXPECT_EQ(answerControlRequest(R"({"devices": false})", target), R"({"error":"unknown request"})");
+}
+
+TEST(ControlRequestsTest, LiveSubscribesTheClientToTheFrameSnapshots) {
+    FakeTarget target;
+    EXPECT_EQ(answerControlRequest(R"({"live": true})", target), R"({"ok":true})");
+    EXPECT_EQ(target.liveAsked, 1);
+}
+
+TEST(ControlRequestsTest, LiveWithAnythingButTrueIsMalformedAndSubscribesNobody) {
+    FakeTarget target;
+    for (const char* request : {R"({"live": false})", R"({"live": 60})", R"({"live": "yes"})", R"({"live": null})"}) {
+        EXPECT_EQ(answerControlRequest(request, target), R"({"error":"malformed request: \"live\" takes true"})")
+            << request;
+    }
+    EXPECT_EQ(target.liveAsked, 0);
+}
+
+TEST(ControlRequestsTest, LiveFromATargetWithoutFramesIsAnError) {
+    FakeTarget target;
+    target.hasLive = false;
+    EXPECT_EQ(answerControlRequest(R"({"live": true})", target),
+              R"({"error":"this daemon has no live frames to give"})");
 }
 
 TEST(ControlRequestsTest, OversizedReplyNamesTheLimit) {

@@ -397,5 +397,70 @@ TEST_F(ControlServerTest, ASubscriberThatDoesNotReadLosesLinesAndIsToldHowMany) 
     EXPECT_NE(text.find("{\"dropped\":"), std::string::npos);
 }
 
+TEST_F(ControlServerTest, AFrameSubscriberGetsFramesButNotTheLinesOfWatchers) {
+    server = std::make_unique<ControlServer>(
+        path,
+        [this](const std::string& line) {
+            server->subscribe(server->currentClient(),
+                              line == "live" ? ControlServer::Channel::Frames : ControlServer::Channel::Lines);
+            return "reply:" + line;
+        },
+        [] { return std::string("too long"); });
+    const int live = connectClient();
+    const int watcher = connectClient();
+    send(live, "live\n");
+    send(watcher, "watch\n");
+    EXPECT_EQ(receiveLines(live, 1), "reply:live\n");
+    EXPECT_EQ(receiveLines(watcher, 1), "reply:watch\n");
+    EXPECT_EQ(server->subscriberCount(ControlServer::Channel::Frames), 1u);
+    EXPECT_EQ(server->subscriberCount(ControlServer::Channel::Lines), 1u);
+    server->push({"log"});
+    server->pushNewest("frame 1");
+    EXPECT_EQ(receiveLines(live, 1), "frame 1\n");
+    EXPECT_EQ(receiveLines(watcher, 1), "log\n");
+}
+
+TEST_F(ControlServerTest, AFrameSubscriberThatReadsSlowlyGetsTheNewestFrameNotABacklog) {
+    server = std::make_unique<ControlServer>(
+        path,
+        [this](const std::string& line) {
+            server->subscribe(server->currentClient(), ControlServer::Channel::Frames);
+            return "reply:" + line;
+        },
+        [] { return std::string("too long"); });
+    const int live = connectClient();
+    send(live, "live\n");
+    EXPECT_EQ(receiveLines(live, 1), "reply:live\n");
+    // A snapshot's size, many times over what the cut send buffer holds, while the client reads
+    // nothing.
+    const size_t pushed = 2000;
+    const std::string padding(1500, 'x');
+    for (size_t i = 0; i < pushed; ++i) server->pushNewest(std::to_string(i) + " " + padding);
+    // Then it reads everything there is, and the server goes on writing as it reads.
+    std::vector<size_t> numbers;
+    std::string text;
+    for (int quiet = 0; quiet < 20;) {
+        serveFor(5);
+        char buffer[4096];
+        const ssize_t got = ::recv(live, buffer, sizeof(buffer), MSG_DONTWAIT);
+        if (got <= 0) {
+            ++quiet;
+            continue;
+        }
+        quiet = 0;
+        text.append(buffer, static_cast<size_t>(got));
+        for (size_t end; (end = text.find('\n')) != std::string::npos; text.erase(0, end + 1)) {
+            const std::string line = text.substr(0, end);
+            ASSERT_EQ(line.size(), std::to_string(std::stoul(line)).size() + 1 + padding.size()) << "a torn line";
+            numbers.push_back(std::stoul(line));
+        }
+    }
+    ASSERT_FALSE(numbers.empty());
+    EXPECT_TRUE(std::is_sorted(numbers.begin(), numbers.end()));
+    EXPECT_EQ(numbers.back(), pushed - 1);  // the newest always arrives
+    // What was on its way when it stopped reading, and the newest: a few lines, never the lot.
+    EXPECT_LT(numbers.size(), 64u);
+}
+
 }  // namespace
 }  // namespace TolkaTouch

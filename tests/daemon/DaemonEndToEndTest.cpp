@@ -10,6 +10,7 @@
 #include <chrono>
 #include <cstring>
 #include <filesystem>
+#include <functional>
 #include <fstream>
 #include <nlohmann/json.hpp>
 #include <string>
@@ -193,6 +194,37 @@ TEST_F(DaemonEndToEndTest, PropertiesCanBeReadAndWrittenWhileReportsFlow) {
                                        file("replay.out"), file("replay.err"));
     EXPECT_EQ(replayStatus, 0) << Testing::readWholeFile(file("replay.err"));
 
+    daemon->signal(SIGTERM);
+    EXPECT_EQ(daemon->wait(10s), 0);
+}
+
+TEST_F(DaemonEndToEndTest, ALiveSubscriberGetsFrameSnapshotsInFrameOrderAndABadRequestOneErrorLine) {
+    auto daemon = startDaemon(synthesize("steady-flow.gestures"), {"--no-keys"});
+    const int fd = connectControl();
+    EXPECT_EQ(exchange(fd, "{\"live\": 60}\n"), "{\"error\":\"malformed request: \\\"live\\\" takes true\"}\n");
+    EXPECT_EQ(exchange(fd, "{\"live\": true}\n"), "{\"ok\":true}\n");
+    std::vector<uint64_t> frames;
+    std::string text;
+    auto deadline = std::chrono::steady_clock::now() + 10s;
+    while (frames.size() < 20 && std::chrono::steady_clock::now() < deadline) {
+        pollfd ready{fd, POLLIN, 0};
+        if (::poll(&ready, 1, 100) <= 0) continue;
+        char buffer[4096];
+        const ssize_t got = ::recv(fd, buffer, sizeof(buffer), 0);
+        if (got <= 0) break;
+        text.append(buffer, static_cast<size_t>(got));
+        for (size_t end; (end = text.find('\n')) != std::string::npos; text.erase(0, end + 1)) {
+            const auto frame = nlohmann::json::parse(text.substr(0, end)).at("frame");
+            EXPECT_EQ(frame.at("service"), 1);
+            EXPECT_EQ(frame.at("readings").size(), 15u);
+            EXPECT_EQ(frame.at("virtual_normalized").size(), 23u);
+            frames.push_back(frame.at("frame").get<uint64_t>());
+        }
+    }
+    ::close(fd);
+    ASSERT_GE(frames.size(), 20u);
+    // Frames come at 125 a second, snapshots at most 60: never the same frame twice, never back.
+    EXPECT_TRUE(std::adjacent_find(frames.begin(), frames.end(), std::greater_equal<>()) == frames.end());
     daemon->signal(SIGTERM);
     EXPECT_EQ(daemon->wait(10s), 0);
 }

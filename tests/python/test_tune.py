@@ -154,6 +154,53 @@ def test_a_failing_evaluation_is_a_failed_trial_and_the_search_goes_on(corpus, m
     assert {t.user_attrs["failure"] for t in failed} == {"the recording cannot be played"}
 
 
+class SimulatedClock:
+    """Optuna's clock for its timeout, moved on by the test instead of by the wall."""
+
+    def __init__(self):
+        import datetime
+
+        self.start = datetime.datetime(2026, 1, 1)
+        self.seconds = 0.0
+        clock = self
+
+        class Datetime(datetime.datetime):
+            @classmethod
+            def now(cls, tz=None):
+                return clock.start + datetime.timedelta(seconds=clock.seconds)
+
+        self.module = type("datetime", (), {"datetime": Datetime, "timedelta": datetime.timedelta})
+
+
+def test_the_search_stops_when_the_timeout_passes_and_counts_the_trials_it_ran(corpus, monkeypatch):
+    clock = SimulatedClock()
+    monkeypatch.setattr(optuna.study._optimize, "datetime", clock.module)
+    real_objective = tuning.objective_function
+    started = []
+
+    def objective_function(search, recordings):
+        run = real_objective(search, recordings)
+
+        def timed(trial):
+            started.append(trial.number)
+            try:
+                return run(trial)
+            finally:
+                clock.seconds += 10.0  # every trial takes ten seconds of the simulated clock
+
+        return timed
+
+    monkeypatch.setattr(tuning, "objective_function", objective_function)
+    # Trials begin at 0, 10 and 20 s; at 30 s the 25 s have passed and no fourth begins.
+    result = small_tune(corpus, trials=100, timeout=25.0)
+    assert started == [0, 1, 2]
+    assert result.trials == 3 == len(result.study.trials)
+    finished = [t for t in result.study.trials if t.state == optuna.trial.TrialState.COMPLETE]
+    assert result.pruned + result.failed + len(finished) == 3
+    report = json.loads(json.dumps(result.to_json()))
+    assert (report["trials"], report["pruned"], report["failed"]) == (3, result.pruned, result.failed)
+
+
 def test_a_pareto_search_prints_its_front(corpus):
     result = small_tune(corpus, trials=4, pareto=True, sampler="nsga2")
     assert result.front and all(set(p) == {"trial", "settings", "macro-f1", "false-activations-per-hour"} for p in result.front)

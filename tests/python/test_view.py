@@ -300,3 +300,22 @@ def test_an_export_past_its_size_says_so(tool, tmp_path):
     assert result.returncode == 1
     assert "an exported page carries at most 20000 (choose a shorter range with --from and --to)" in result.stderr
     assert not (tmp_path / "out.html").exists()
+
+
+def test_an_exported_page_carries_the_description_lines_the_served_page_shows(server, tool, tmp_path):
+    from tolkatouch._view_data import ViewData
+    from tolkatouch._view_export import export_data
+
+    exported = export_data(ViewData.open(str(SESSION)), 10.0, 14.0)
+    columns = exported["columns"]
+    touching = [offset for offset, on in enumerate(columns["touching"]) if on]
+    assert touching, "the range holds a touch"
+    for offset in (0, touching[0], touching[-1], len(columns["frame"]) - 1):
+        status, answer = api(server, "frame", f"n={exported['first'] + offset}")
+        assert status == 200
+        assert columns["description"][offset] == answer["values"]["description"]
+        assert columns["virtual_description"][offset] == answer["values"]["virtual_description"]
+    out = tmp_path / "range.html"
+    result = run_tool(tool, "view", str(SESSION), "--export", str(out), "--from", "10", "--to", "14")
+    assert result.returncode == 0, result.stderr
+    assert json.dumps(columns["description"][touching[0]])[1:-1] in out.read_text()

@@ -1,6 +1,7 @@
 """The viewer's page in headless Chromium: it loads with no console errors, the surface shows a
 frame's numbers as the Python arrays have them, a what-if gives `replay --set`'s events, a URL
-reopens its view, and an exported page opens from disk with no request out."""
+reopens its view, an exported page opens from disk with no request out, and the live page follows a
+simulated daemon and says so when it goes away."""
 
 import json
 import os
@@ -14,7 +15,7 @@ import pytest
 import tolkatouch
 
 from conftest import EXAMPLES, json_events
-from view_fixtures import labelled_recording, running_server
+from view_fixtures import daemon_program, labelled_recording, running_server, serving, start_daemon  # noqa: F401
 
 SESSION = EXAMPLES / "everyday-session.json"
 CHROMIUM = "/usr/bin/chromium"
@@ -163,6 +164,45 @@ def test_the_exported_page_opens_from_disk_with_no_request_out(browser, tmp_path
     open_page(browser, out.as_uri() + f"#frame={first + 5}")
     shown = pixel_numbers(browser)
     assert [shown[letter][0] for letter in tolkatouch.PIXEL_NAMES] == frames.readings[first + 5].tolist()
+    details = browser.execute_script(
+        "return Object.fromEntries([...document.querySelectorAll('#details tr')].map(r => [r.dataset.key, r.cells[1].textContent]))")
+    row = {name: getattr(frames, name)[first + 5] for name in frames.__dataclass_fields__}
+    lines = tolkatouch._tolkatouch.description_lines({k: v.tolist() if hasattr(v, "tolist") else v for k, v in row.items()})
+    assert (details["description"], details["virtual_description"]) == lines
+
+
+def test_the_live_page_shows_the_daemons_newest_frame_and_says_when_the_daemon_goes(browser, daemon_program, tmp_path):
+    from tolkatouch._view_live import LiveData
+
+    socket_path = tmp_path / "d.sock"
+    daemon = start_daemon(daemon_program, socket_path, SESSION)
+    server, thread = serving(LiveData.connect(str(socket_path)))
+    try:
+        browser.get_log("browser")
+        open_page(browser, server.url)
+        wait_for(browser, "return document.body.dataset.frame !== undefined")
+        frame, shown = browser.execute_script("""
+            const out = {};
+            for (const g of document.querySelectorAll('#surface g.pixel')) out[g.dataset.pixel] = Number(g.dataset.reading);
+            return [Number(document.body.dataset.frame), out];""")
+        frames = tolkatouch.replay(tolkatouch.Recording.load(str(SESSION))).frames
+        (index,) = (frames.frame == frame).nonzero()[0]
+        assert [shown[letter] for letter in tolkatouch.PIXEL_NAMES] == frames.readings[index].tolist()
+        assert browser.execute_script("return document.querySelectorAll('#timeline .heatmaplayer, #timeline .hm').length") > 0
+        assert not browser.find_element("id", "whatif-panel").is_displayed()
+        assert not browser.find_element("id", "live-message").is_displayed()
+        daemon.terminate()
+        daemon.wait(10)
+        message = wait_for(browser, "return document.body.dataset.liveGone === '1' && document.getElementById('live-message').textContent")
+        assert message == "tolkatouchd went away (tolkatouchd closed the connection): the page shows the last snapshots it sent."
+        assert browser.find_element("id", "live-message").is_displayed()
+        assert console_errors(browser) == []
+    finally:
+        if daemon.poll() is None:
+            daemon.kill()
+        server.shutdown()
+        server.server_close()
+        thread.join()
 
 
 def test_the_readme_screenshot_is_taken_from_the_shipped_example(browser, tmp_path):

@@ -1,6 +1,7 @@
 // The viewer page: a timeline of level-of-detail views the server computes, the surface at one
 // frame with its snapshot's numbers, and a what-if replay under other settings. An exported page
-// carries its data in window.TOLKA_EXPORT and asks no server.
+// carries its data in window.TOLKA_EXPORT and asks no server. A live page (the server follows the
+// running daemon) polls the newest snapshots and scrolls the last 30 s of timeline.
 "use strict";
 (function () {
   const EXPORTED = window.TOLKA_EXPORT || null;
@@ -272,12 +273,15 @@
     });
   }
 
+  // Numbers as the served page has them (four decimals); a live snapshot carries the exact floats.
+  function shown(x) { return x === true ? "on" : x === false ? "-" : typeof x === "number" ? String(round(x, 4)) : x; }
+
   function describe(key, value) {
     if (Array.isArray(value) && value.length === info.pixels.length)
-      return value.map((x, i) => `${info.pixels[i]}=${x === true ? "on" : x === false ? "-" : x}`).join(" ");
+      return value.map((x, i) => `${info.pixels[i]}=${shown(x)}`).join(" ");
     if (Array.isArray(value) && value.length === info.virtual_groups.length)
-      return value.map((x, i) => `${info.virtual_groups[i]}=${x === true ? "on" : x === false ? "-" : x}`).join(" ");
-    return String(value);
+      return value.map((x, i) => `${info.virtual_groups[i]}=${shown(x)}`).join(" ");
+    return typeof value === "number" ? shown(value) : String(value);
   }
 
   function drawDetails() {
@@ -442,15 +446,107 @@
     }
   }
 
+  // Live --------------------------------------------------------------------------------------
+  const LIVE_POLL_MS = 200;
+  const live = {sequence: 0, series: null, timer: null, drawn: false};
+
+  function showLiveMessage(text) {
+    const message = document.getElementById("live-message");
+    message.textContent = text;
+    message.hidden = !text;
+    document.body.dataset.liveGone = text ? "1" : "";
+  }
+
+  function appendSeries(series, now, window) {
+    if (!live.series) live.series = {seconds: [], frame: [], heat: [], on: [], touch_score: [], svm_score: [], hand: [], region: []};
+    for (const key of Object.keys(live.series)) live.series[key].push(...series[key]);
+    let drop = 0;
+    while (drop < live.series.seconds.length && live.series.seconds[drop] < now - window) drop++;
+    if (drop) for (const key of Object.keys(live.series)) live.series[key].splice(0, drop);
+  }
+
+  function liveFigure(now, window) {
+    const s = live.series;
+    const rows = info.heat_rows;
+    const column = (matrix, r) => matrix.map(values => values[r]);
+    const traces = [
+      {type: "heatmap", name: "readings", x: s.seconds, y: rows, z: rows.map((_, r) => column(s.heat, r)), xaxis: "x", yaxis: "y",
+        colorscale: "Viridis", zmin: 0, colorbar: {len: 0.45, y: 1, yanchor: "top", thickness: 10, title: {text: "reading"}},
+        hovertemplate: "%{y} %{z} at %{x:.3f} s<extra></extra>"},
+      {type: "heatmap", name: "on", x: s.seconds, y: rows, z: rows.map((_, r) => column(s.on, r)), xaxis: "x", yaxis: "y2",
+        zmin: 0, zmax: 1, colorscale: [[0, "#ffffff"], [1, "#00acc1"]], showscale: false},
+      {type: "scatter", mode: "lines", name: "touch score", x: s.seconds, y: s.touch_score, xaxis: "x", yaxis: "y3",
+        line: {color: "#1f77b4", width: 1}},
+      {type: "scatter", mode: "lines", name: "classifier score", x: s.seconds, y: s.svm_score, xaxis: "x", yaxis: "y3",
+        line: {color: "#999999", width: 0.7}},
+      {type: "heatmap", name: "hand", x: s.seconds, y: [1], z: [s.hand], xaxis: "x", yaxis: "y4", zmin: -0.5, zmax: 3.5,
+        colorscale: discreteScale(HAND_COLOURS), showscale: false, hovertemplate: "hand %{z} (1 touching, 2 holding, 3 hold suppressed)<extra></extra>"},
+      {type: "heatmap", name: "active region", x: s.seconds, y: [0], z: [s.region], xaxis: "x", yaxis: "y4", zmin: -0.5, zmax: 3.5,
+        colorscale: discreteScale(REGION_COLOURS), showscale: false, hovertemplate: "region %{z}<extra></extra>"},
+    ];
+    const layout = {
+      margin: {l: 90, r: 60, t: 10, b: 35}, uirevision: "live", hovermode: "closest",
+      legend: {orientation: "h", x: 0.5, y: 0.375, xanchor: "center", yanchor: "bottom", font: {size: 10}, bgcolor: "rgba(0,0,0,0)"},
+      xaxis: {anchor: "y4", range: [Math.max(0, now - window), Math.max(now, window)],
+        title: {text: `seconds since the viewer connected (the last ${window} s)`, standoff: 4}},
+      yaxis: {domain: [0.58, 1], autorange: "reversed", type: "category", dtick: 1, tickfont: {size: 9}, title: {text: "reading by zone"}, fixedrange: true},
+      yaxis2: {domain: [0.42, 0.565], autorange: "reversed", type: "category", showticklabels: false, title: {text: "on"}, fixedrange: true},
+      yaxis3: {domain: [0.20, 0.37], range: [-115, 115], title: {text: "score"}, fixedrange: true},
+      yaxis4: {domain: [0, 0.18], range: [-0.5, 1.5], tickvals: [0, 1], ticktext: ["active region", "hand"], tickfont: {size: 9}, fixedrange: true},
+    };
+    return {traces, layout};
+  }
+
+  async function pollLive() {
+    let answer;
+    try {
+      answer = await api("live", {after: live.sequence});
+    } catch (failure) {
+      showLiveMessage("The viewer's server does not answer (" + failure.message + "): the page shows what it had.");
+      return;
+    }
+    appendSeries(answer.series, answer.now, answer.window);
+    live.sequence = answer.sequence;
+    if (answer.latest) {
+      frameValues = answer.latest;
+      document.getElementById("frame-number").textContent = frameValues.frame;
+      document.getElementById("frame-time").textContent =
+        `(${frameValues.seconds.toFixed(3)} s, service ${frameValues.service}, ${frameValues.transition_name})`;
+      document.body.dataset.frame = frameValues.frame;
+      drawSurface();
+      drawDetails();
+    }
+    await Plotly.react("timeline", ...Object.values(liveFigure(answer.now, answer.window)), {responsive: true, displaylogo: false});
+    showStatus(`${live.series.seconds.length} snapshots in the last ${answer.window} s`);
+    document.body.dataset.ready = "1";
+    if (!answer.connected) {
+      showLiveMessage(`tolkatouchd went away (${answer.message}): the page shows the last snapshots it sent.`);
+      return;
+    }
+    live.timer = setTimeout(pollLive, LIVE_POLL_MS);
+  }
+
+  function startLive() {
+    document.body.classList.add("live");
+    document.title = `${info.name} - tolkatouch view`;
+    document.getElementById("title").textContent = info.name;
+    document.getElementById("summary").textContent = "the running service, at most 60 frames a second";
+    document.querySelector("#surface-panel h2").firstChild.textContent = "Surface at firmware frame ";
+    document.querySelector("#surface-panel .hint").textContent = "The newest frame the service sent; the timeline scrolls with it.";
+    drawSurface();
+    return pollLive();
+  }
+
   // Start -------------------------------------------------------------------------------------
   function showError(failure) { showStatus("error: " + failure.message); }
 
   async function start() {
     readHash();
     // The first timeline is asked for beside the recording's description: one round trip less.
-    const firstTimeline = state.settings === null ? fetchTimeline() : null;
+    const firstTimeline = state.settings === null && !document.body.classList.contains("live") ? fetchTimeline() : null;
     if (firstTimeline) firstTimeline.catch(() => {});
     info = await api("info", {});
+    if (info.live) return startLive();
     document.title = `${info.name} - tolkatouch view`;
     document.getElementById("title").textContent = info.name;
     document.getElementById("summary").textContent =
