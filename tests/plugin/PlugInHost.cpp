@@ -37,11 +37,10 @@ uint32_t uniqueServiceHandle() {
 void EventCollector::callback(void* target, void* refcon, void* sender, const HIDEventRef& event, uint32_t options) {
     auto* collector = static_cast<EventCollector*>(target);
     bool onQueue = collector->_queue && collector->_queue->isCurrent();
-    {
-        std::lock_guard lock(collector->_mutex);
-        collector->_events.push_back(
-            ReceivedEvent{target, refcon, sender, event, options, std::this_thread::get_id(), onQueue});
-    }
+    // Notified under the lock: a test that has seen its count may destroy the collector at once,
+    // and must not find this thread still inside the condition variable.
+    std::lock_guard lock(collector->_mutex);
+    collector->_events.push_back(ReceivedEvent{target, refcon, sender, event, options, std::this_thread::get_id(), onQueue});
     collector->_changed.notify_all();
 }
 
