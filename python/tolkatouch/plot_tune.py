@@ -68,7 +68,7 @@ def main(argv: Optional[Sequence[str]] = None) -> int:
     import optuna
 
     from .plot import error_lines
-    from .tune import DEFAULT_STUDY, CorpusError, open_storage
+    from ._tune_storage import DEFAULT_STUDY, CorpusError, open_storage
 
     parser = argparse.ArgumentParser(prog="python3 -m tolkatouch.plot_tune", description="Draw a settings search.")
     parser.add_argument("--storage", required=True, metavar="URL", help="the study's storage, as tune --storage takes it")

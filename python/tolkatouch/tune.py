@@ -37,10 +37,10 @@ from . import Error, Recording
 from . import _tolkatouch as _core
 from ._tune_space import Dimension, SpaceError, clamp_default, defaults_of, parse_space
 from ._tune_split import Split, split_corpus, stratum
+from ._tune_storage import DEFAULT_STUDY, CorpusError, TuneError, open_storage
 
 DEFAULT_OBJECTIVE = "macro-f1"
 DEFAULT_HELDOUT = 0.3
-DEFAULT_STUDY = "tolkatouch-tune"
 DEFAULT_TOLERANCE_MS = 100.0
 SAMPLERS = ("tpe", "cmaes", "random", "nsga2")
 PRUNERS = ("median", "halving", "none")
@@ -49,14 +49,6 @@ SHARES = (0.125, 0.25, 0.5, 1.0)
 FALSE_ACTIVATIONS = "false-activations-per-hour"
 EXIT_FAILURE = 1
 EXIT_USAGE = 2
-
-
-class TuneError(ValueError):
-    """An option the search cannot run with, said in one line that names it."""
-
-
-class CorpusError(TuneError):
-    """A corpus or a storage the search cannot run on, said in one line that names it."""
 
 
 @dataclass(frozen=True)
@@ -283,34 +275,6 @@ def make_pruner(name: str):
     raise TuneError(f'--pruner {name}: unknown pruner ({", ".join(PRUNERS)})')
 
 
-def open_storage(url: Optional[str]):
-    """Optuna's storage for a URL: None (in memory), journal:PATH (a journal file several
-    processes may share) or a database URL (sqlite:///PATH, postgresql://...). TuneError naming
-    the URL when it cannot be opened."""
-    import optuna
-
-    if url is None:
-        return None
-    import warnings
-
-    warnings.filterwarnings("ignore", category=optuna.exceptions.ExperimentalWarning)
-    try:
-        if url.startswith("journal:"):
-            path = url[len("journal:"):]
-            if not path:
-                raise ValueError("no journal file named")
-            directory = os.path.dirname(os.path.abspath(path))
-            if not os.path.isdir(directory):
-                raise FileNotFoundError(f"no folder {directory}")
-            if not os.access(path if os.path.exists(path) else directory, os.W_OK):
-                raise PermissionError("not writable")
-            return optuna.storages.JournalStorage(optuna.storages.JournalFileStorage(path))
-        return optuna.storages.RDBStorage(url)
-    except Exception as error:  # Optuna's storages raise their back end's own errors
-        reason = str(error).strip().splitlines()[0] if str(error).strip() else type(error).__name__
-        raise CorpusError(f"--storage {url}: cannot be opened: {reason}") from None
-
-
 def _study_description(search: Search, heldout_fraction: float) -> dict:
     return {"objective": search.objective, "pareto": search.pareto, "heldout": heldout_fraction,
             "space": [[d.key, d.kind, d.low, d.high, d.log] for d in search.space]}
@@ -383,6 +347,26 @@ def run_trials(study, search: Search, tuning: Sequence[Recording], trials: int, 
     callback = optuna.study.MaxTrialsCallback(trials, states=begun)
     study.optimize(objective_function(search, tuning), n_trials=remaining, timeout=timeout, n_jobs=max(1, jobs),
                    catch=(Error, RuntimeError, ValueError), callbacks=[callback], gc_after_trial=False)
+
+
+# The tuning part as a Dask worker process read it, by its paths: read once per process.
+_worker_recordings: Dict[tuple, list] = {}
+
+
+def worker_trials(storage, study_name: str, search: Search, tuning_paths: tuple, trials: int,
+                  timeout: Optional[float], sampler: str, seed: Optional[int], pruner: str) -> int:
+    """A Dask worker's share of a study: trials until the study holds `trials`; the study's
+    trials in all when done."""
+    import optuna
+
+    if tuning_paths not in _worker_recordings:
+        _worker_recordings[tuning_paths] = load_recordings(tuning_paths, 1)
+    study = optuna.load_study(study_name=study_name, storage=storage,
+                              sampler=make_sampler(sampler, seed, search.pareto),
+                              pruner=make_pruner("none" if search.pareto else pruner))
+    optuna.logging.set_verbosity(optuna.logging.WARNING)
+    run_trials(study, search, _worker_recordings[tuning_paths], trials, timeout, 1)
+    return len(study.get_trials(deepcopy=False))
 
 
 def counted_trials(study) -> list:
@@ -460,7 +444,9 @@ def tune(corpus: Sequence[str], trials: int = 100, space: Sequence[str] = (), ob
     if client is not None:
         from .tune_dask import run_on_workers
 
-        run_on_workers(client, the_study, search, loaded.split.tuning, trials, timeout, sampler, seed, pruner)
+        run_on_workers(client, worker_trials, lambda n: (
+            the_study._storage, the_study.study_name, search, tuple(loaded.split.tuning), trials, timeout, sampler,
+            None if seed is None else seed + n, pruner))
     else:
         run_trials(the_study, search, loaded.tuning, trials, timeout, jobs)
 
