@@ -8,7 +8,7 @@ import json
 import os
 import threading
 from collections import OrderedDict
-from typing import List, Optional, Sequence
+from typing import Optional, Sequence
 
 import numpy as np
 
@@ -31,6 +31,21 @@ MAX_LISTED = 200
 CACHED_REPLAYS = 4
 #: The eval tolerance, as `tolkatouch eval` takes it by default.
 TOLERANCE_US = 100_000
+
+
+def surface_layout() -> dict:
+    """What the page needs to draw the surface and name its numbers, the same for a recording
+    and for the live service."""
+    return {
+        "pixels": list(PIXEL_NAMES),
+        "heat_rows": [PIXEL_NAMES[i] for i in HEAT_ROWS],
+        "zones": {str(region): ZONE_PIXELS[region] for region in ZONE_ORDER},
+        "region_names": list(REGION_NAMES),
+        "transition_names": list(TRANSITION_NAMES),
+        "hold_clock_names": list(HOLD_CLOCK_NAMES),
+        "pads": [list(pad) for pad in _core.surface_pads()],
+        "virtual_groups": list(_core.virtual_groups()),
+    }
 
 
 def _round(values: np.ndarray, digits: int = 3) -> list:
@@ -187,14 +202,7 @@ class ViewData:
             "duration": float(self.seconds[-1]) if len(self.seconds) else 0.0,
             "settings": self.settings,
             "table": table,
-            "pixels": list(PIXEL_NAMES),
-            "heat_rows": [PIXEL_NAMES[i] for i in HEAT_ROWS],
-            "zones": {str(region): ZONE_PIXELS[region] for region in ZONE_ORDER},
-            "region_names": list(REGION_NAMES),
-            "transition_names": list(TRANSITION_NAMES),
-            "hold_clock_names": list(HOLD_CLOCK_NAMES),
-            "pads": [list(pad) for pad in _core.surface_pads()],
-            "virtual_groups": list(_core.virtual_groups()),
+            **surface_layout(),
             "has_labels": self.recording.labels is not None,
             "labels": [{"kind": l.kind, "zone": l.zone, "to_zone": l.to_zone, "start": l.start_us / 1e6,
                         "end": l.end_us / 1e6} for l in labels],

@@ -15,10 +15,10 @@ import time
 from collections import deque
 from typing import Optional
 
-from . import HOLD_CLOCK_NAMES, PIXEL_NAMES, REGION_NAMES, TRANSITION_NAMES, ZONE_PIXELS
+from . import HOLD_CLOCK_NAMES, REGION_NAMES, TRANSITION_NAMES
 from . import _tolkatouch as _core
 from ._errors import printable
-from ._view_data import HEAT_ROWS, HOLD_TRANSITIONS, ZONE_ORDER
+from ._view_data import HEAT_ROWS, HOLD_TRANSITIONS, surface_layout
 
 #: Seconds of snapshots kept and drawn.
 WINDOW_SECONDS = 30.0
@@ -161,14 +161,7 @@ class LiveData:
             "window": WINDOW_SECONDS,
             "settings": [],
             "table": [],
-            "pixels": list(PIXEL_NAMES),
-            "heat_rows": [PIXEL_NAMES[i] for i in HEAT_ROWS],
-            "zones": {str(region): ZONE_PIXELS[region] for region in ZONE_ORDER},
-            "region_names": list(REGION_NAMES),
-            "transition_names": list(TRANSITION_NAMES),
-            "hold_clock_names": list(HOLD_CLOCK_NAMES),
-            "pads": [list(pad) for pad in _core.surface_pads()],
-            "virtual_groups": list(_core.virtual_groups()),
+            **surface_layout(),
             "labels": [],
         }
 
