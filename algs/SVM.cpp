@@ -58,6 +58,28 @@ float scoreOfRanked(const int32_t* ranked, const float* means, const float* scal
 
 #undef TOLKA_SCORE_VARIANTS
 
+// Largest first; equal values are interchangeable, so any correct sort gives the same list. In a
+// touch most elements read 0 or below: the values above 0 are moved to the front without branches,
+// and each side is sorted on its own, the few positive ones and the many equal ones both cheaply.
+// No allocation: std::sort works in place.
+void sortDescending(std::array<int32_t, kRankCount>& values, size_t count) {
+    std::array<int32_t, kRankCount> split;
+    size_t positive = 0;
+    size_t rest = count;
+    for (size_t i = 0; i < count; ++i) {
+        const int32_t v = values[i];
+        const bool above = v > 0;
+        split[positive] = v;
+        split[rest - 1] = v;
+        positive += above;
+        rest -= !above;
+    }
+    std::copy_n(split.begin(), count, values.begin());
+    std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(positive), std::greater<int32_t>());
+    std::sort(values.begin() + static_cast<std::ptrdiff_t>(positive), values.begin() + static_cast<std::ptrdiff_t>(count),
+              std::greater<int32_t>());
+}
+
 }  // namespace
 
 SVM::SVM() {
@@ -81,7 +103,19 @@ void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualP
     size_t n = 0;
     for (const Pixel& p : pixels) values[n++] = p.value;
     for (const VirtualPixel& p : virtualPixels) values[n++] = p.value;
+    scoreValues(values, count, gate);
+}
 
+void SVM::updateSVMScore(const RealPixels& pixels, const VirtualPixels& virtualPixels, float gate) {
+    static_assert(RealPixels::size() + VirtualPixels::size() == kRankCount);
+    score = 0.0f;
+    std::array<int32_t, kRankCount> values;
+    std::copy_n(pixels.value.begin(), RealPixels::size(), values.begin());
+    std::copy_n(virtualPixels.value.begin(), VirtualPixels::size(), values.begin() + RealPixels::size());
+    scoreValues(values, kRankCount, gate);
+}
+
+void SVM::scoreValues(std::array<int32_t, kRankCount>& values, size_t count, float gate) {
     // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
     // sort. Rank 0 above the gate means some value converts above it (the conversion keeps
     // order); rank 1 at noise or above means two values are.
@@ -95,13 +129,12 @@ void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualP
 
     if (count == kRankCount) {
         // 3., 5. The surface's 38 elements.
-        // 3. Largest first; equal values are interchangeable here. A sort of 38 in place: one
-        // partition, then insertion runs, no allocation.
-        std::sort(values.begin(), values.end(), std::greater<int32_t>());
+        // 3. Largest first.
+        sortDescending(values, kRankCount);
         score = scoreOfRanked(values.data(), means.data(), scales.data(), weights.data());
     } else {
         // Fewer elements than ranks: the first `count` ranks, in the same order of operations.
-        std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(count), std::greater<int32_t>());
+        sortDescending(values, count);
         for (size_t i = 0; i < count; ++i) {
             score = std::fma((static_cast<float>(values[i]) - means[i]) / scales[i], weights[i], score);
         }
