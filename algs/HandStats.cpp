@@ -4,6 +4,8 @@
 #include <cmath>
 #include <limits>
 #include <stdexcept>
+#include <tuple>
+#include <type_traits>
 #include <utility>
 
 namespace TolkaTouch {
@@ -107,30 +109,63 @@ void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<cons
 void HandStats::updateHandState(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time) {
     // 1. Scan the real pixels, then the virtual ones: the strongest on element since the last
     // Reset, whether anything is on or above noise, and this frame's strongest element.
-    // Kept in locals and stored once: the pixels are floats too, so stores to members inside the
-    // loop would make every pixel be read again.
-    bool someOn = false;
-    bool someAboveNoise = false;
-    float strongestStrength = 0.0f;
-    int32_t strongestIndex = 0;
-    float maxOn = maxOnStrength;
-    int32_t maxOnAt = maxOnIndex;
-    const auto scan = [&](const auto& bank) {
-        for (size_t i = 0; i < bank.size(); ++i) {
-            const float s = std::max(bank.normalized[i], 0.0f);
-            const bool on = bank.isOn[i] != 0;
-            const bool strongerOn = on && s > maxOn;
-            maxOnAt = strongerOn ? bank.index[i] : maxOnAt;
-            maxOn = strongerOn ? s : maxOn;
-            someOn |= on;
-            someAboveNoise |= bank.aboveNoise[i] != 0;
-            const bool stronger = s > strongestStrength;
-            strongestIndex = stronger ? bank.index[i] : strongestIndex;
-            strongestStrength = stronger ? s : strongestStrength;
+    // Read as the rows' maxima first, eight lanes at a time, which the compiler turns into vector
+    // code: with s = max(normalized, 0), this frame's strongest element is the first whose s is
+    // the largest s (when above 0), and the strongest on element the first on one whose s is the
+    // largest on s (when above the record). That is what a scan keeping each strictly stronger
+    // element finds; not-a-number strengths never win either way. Padding lanes are never on and
+    // their s is never above 0.
+    constexpr float kNone = -std::numeric_limits<float>::infinity();
+    std::array<float, 8> strongestLanes{};
+    std::array<float, 8> strongestOnLanes;
+    strongestOnLanes.fill(kNone);
+    int32_t someOnLanes = 0;
+    int32_t someAboveNoiseLanes = 0;
+    const auto maxima = [&](const auto& row) {
+        static_assert(std::remove_cvref_t<decltype(row)>::kLanes == 8);
+        for (size_t b = 0; b < row.normalized.size(); b += 8) {
+            for (size_t j = 0; j < 8; ++j) {
+                const float s = std::max(row.normalized[b + j], 0.0f);
+                const int32_t on = row.isOn[b + j];
+                strongestLanes[j] = std::max(strongestLanes[j], s);
+                strongestOnLanes[j] = std::max(strongestOnLanes[j], on != 0 ? s : kNone);
+                someOnLanes |= on;
+                someAboveNoiseLanes |= row.aboveNoise[b + j];
+            }
         }
     };
-    scan(pixels);
-    scan(virtualPixels);
+    maxima(pixels);
+    maxima(virtualPixels);
+    float strongest = 0.0f;
+    float strongestOn = kNone;
+    for (size_t j = 0; j < 8; ++j) {
+        strongest = std::max(strongest, strongestLanes[j]);
+        strongestOn = std::max(strongestOn, strongestOnLanes[j]);
+    }
+    const bool someOn = someOnLanes != 0;
+    const bool someAboveNoise = someAboveNoiseLanes != 0;
+
+    // The first element, real pixels then virtual ones, whose s equals m (among the on ones only
+    // when onOnly): its index and its own s.
+    const auto firstAt = [&](float m, bool onOnly) -> std::pair<int32_t, float> {
+        const auto search = [&](const auto& row, std::pair<int32_t, float>& found) {
+            for (size_t i = 0; i < row.size(); ++i) {
+                const float s = std::max(row.normalized[i], 0.0f);
+                if (s == m && (!onOnly || row.isOn[i] != 0)) {
+                    found = {row.index[i], s};
+                    return true;
+                }
+            }
+            return false;
+        };
+        std::pair<int32_t, float> found{0, 0.0f};
+        if (!search(pixels, found)) search(virtualPixels, found);
+        return found;
+    };
+    const int32_t strongestIndex = strongest > 0.0f ? firstAt(strongest, false).first : 0;
+    float maxOn = maxOnStrength;
+    int32_t maxOnAt = maxOnIndex;
+    if (strongestOn > maxOn) std::tie(maxOnAt, maxOn) = firstAt(strongestOn, true);
     maxOnStrength = maxOn;
     maxOnIndex = maxOnAt;
 

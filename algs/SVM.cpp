@@ -59,25 +59,42 @@ float scoreOfRanked(const int32_t* ranked, const float* means, const float* scal
 #undef TOLKA_SCORE_VARIANTS
 
 // Largest first; equal values are interchangeable, so any correct sort gives the same list. In a
-// touch most elements read 0 or below: the values above 0 are moved to the front without branches,
-// and each side is sorted on its own, the few positive ones and the many equal ones both cheaply.
-// No allocation: std::sort works in place.
+// touch most elements read 0: the values above 0 go to the front and those below 0 to the back
+// without branches, the zeros fill the middle, and only the few on either side are sorted. No
+// allocation: std::sort works in place.
 void sortDescending(std::array<int32_t, kRankCount>& values, size_t count) {
-    std::array<int32_t, kRankCount> split;
+    std::array<int32_t, kRankCount> split{};
     size_t positive = 0;
-    size_t rest = count;
+    size_t negative = 0;
     for (size_t i = 0; i < count; ++i) {
         const int32_t v = values[i];
-        const bool above = v > 0;
         split[positive] = v;
-        split[rest - 1] = v;
-        positive += above;
-        rest -= !above;
+        positive += v > 0;
     }
+    for (size_t i = 0; i < count; ++i) {
+        const int32_t v = values[i];
+        split[count - 1 - negative] = v;
+        negative += v < 0;
+    }
+    // The slots between hold 0 or a stale copy; they are all zeros.
+    std::fill(split.begin() + static_cast<std::ptrdiff_t>(positive),
+              split.begin() + static_cast<std::ptrdiff_t>(count - negative), 0);
     std::copy_n(split.begin(), count, values.begin());
     std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(positive), std::greater<int32_t>());
-    std::sort(values.begin() + static_cast<std::ptrdiff_t>(positive), values.begin() + static_cast<std::ptrdiff_t>(count),
-              std::greater<int32_t>());
+    std::sort(values.begin() + static_cast<std::ptrdiff_t>(count - negative),
+              values.begin() + static_cast<std::ptrdiff_t>(count), std::greater<int32_t>());
+}
+
+// Whether a frame is scored: something converts above the gate, or two values are at noise or
+// above. Counted, not branched on, so that the loop becomes vector code.
+bool worthScoring(const int32_t* values, size_t count, float gate) {
+    int32_t aboveGate = 0;
+    int32_t aboveNoise = 0;
+    for (size_t i = 0; i < count; ++i) {
+        aboveGate |= static_cast<int32_t>(static_cast<float>(values[i]) > gate);
+        aboveNoise += static_cast<int32_t>(values[i] >= Pixel::kNoiseLevel + 1);
+    }
+    return aboveGate != 0 || aboveNoise >= 2;
 }
 
 }  // namespace
@@ -119,13 +136,7 @@ void SVM::scoreValues(std::array<int32_t, kRankCount>& values, size_t count, flo
     // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
     // sort. Rank 0 above the gate means some value converts above it (the conversion keeps
     // order); rank 1 at noise or above means two values are.
-    bool aboveGate = false;
-    size_t aboveNoise = 0;
-    for (size_t i = 0; i < count; ++i) {
-        aboveGate |= static_cast<float>(values[i]) > gate;
-        aboveNoise += values[i] >= Pixel::kNoiseLevel + 1;
-    }
-    if (!aboveGate && aboveNoise < 2) return;
+    if (!worthScoring(values.data(), count, gate)) return;
 
     if (count == kRankCount) {
         // 3., 5. The surface's 38 elements.
