@@ -15,6 +15,7 @@
 #include "algs/VirtualImage.h"
 #include "algs/VirtualPixel.h"
 #include "common/Reports.h"
+#include "platform/EventList.h"
 #include "platform/HIDEvent.h"
 #include "platform/Log.h"
 #include "platform/PropertyValue.h"

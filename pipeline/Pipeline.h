@@ -22,6 +22,7 @@
 #include "pipeline/PipelineInput.h"
 #include "pipeline/PipelineOutput.h"
 #include "common/Reports.h"
+#include "platform/EventList.h"
 #include "platform/HIDEvent.h"
 #include "platform/PropertyValue.h"
 

@@ -5,6 +5,7 @@
 #include <exception>
 #include <optional>
 #include <stdexcept>
+#include <vector>
 
 #include <nlohmann/json.hpp>
 #include <simdjson.h>
@@ -30,7 +31,17 @@ struct Stop {
 // Anything else stops it; the general reader then decides.
 Stop readFast(const uint8_t* data, size_t size, std::list<Frame>& frames) {
     Stop stop;
-    simdjson::padded_string text(reinterpret_cast<const char*>(data), size);
+    // The parser reads past the end of the text, so it works on a copy with room after it. A
+    // service's recording (well under a megabyte) is copied into storage kept for the next read,
+    // which spares the allocator a large block per document; larger ones get storage of their own.
+    constexpr size_t kKeptStorage = size_t{1} << 20;
+    static thread_local std::vector<char> kept;
+    std::vector<char> own;
+    std::vector<char>& storage = size + simdjson::SIMDJSON_PADDING <= kKeptStorage ? kept : own;
+    storage.resize(size + simdjson::SIMDJSON_PADDING);
+    if (size != 0) std::memcpy(storage.data(), data, size);
+    std::memset(storage.data() + size, 0, simdjson::SIMDJSON_PADDING);
+    const simdjson::padded_string_view text(storage.data(), size, storage.size());
     static thread_local simdjson::ondemand::parser parser;
     simdjson::ondemand::document document;
     if (parser.iterate(text).get(document)) return stop;

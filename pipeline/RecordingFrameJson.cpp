@@ -9,6 +9,7 @@
 #include <nlohmann/json.hpp>
 
 #include "common/Util.h"
+#include "pipeline/ReportHex.h"
 #include "platform/PropertyValueJson.h"
 
 namespace TolkaTouch::RecordingFrameJson {
@@ -22,29 +23,6 @@ using simdjson::ondemand::value;
 // A state value sits inside the document object, the "Frames" array and its frame object; what
 // it nests beyond the reader's limit is written as null (and, read, left to the general reader).
 constexpr size_t kValueNestingDepth = PropertyValueJson::kMaxNestingDepth - 3;
-
-constexpr std::array<int8_t, 256> kHexDigits = [] {
-    std::array<int8_t, 256> digits{};
-    for (auto& digit : digits) digit = -1;
-    for (int c = '0'; c <= '9'; ++c) digits[c] = static_cast<int8_t>(c - '0');
-    for (int c = 'a'; c <= 'f'; ++c) digits[c] = static_cast<int8_t>(c - 'a' + 10);
-    for (int c = 'A'; c <= 'F'; ++c) digits[c] = static_cast<int8_t>(c - 'A' + 10);
-    return digits;
-}();
-
-// Two hex digits (the first in the low byte) to their byte, -1 for any other pair: one look-up
-// a byte. Only the 22 x 22 digit pairs are ever read, a few kilobytes of the table.
-constexpr std::array<int16_t, 65536> kHexPairs = [] {
-    std::array<int16_t, 65536> pairs{};
-    for (auto& pair : pairs) pair = -1;
-    for (int high = 0; high < 256; ++high) {
-        if (kHexDigits[high] < 0) continue;
-        for (int low = 0; low < 256; ++low) {
-            if (kHexDigits[low] >= 0) pairs[high | low << 8] = static_cast<int16_t>(kHexDigits[high] << 4 | kHexDigits[low]);
-        }
-    }
-    return pairs;
-}();
 
 // The text between the quotes of a string token without escapes; nothing when it has any.
 std::optional<std::string_view> plainString(value& member) {
@@ -107,36 +85,9 @@ std::optional<PropertyValue> stateValue(value& member) {
 
 bool unsignedMember(value& member, uint64_t& number) { return !member.get_uint64().get(number); }
 
-}  // namespace
-
-namespace {
-
-// The writer's form, "hh " per byte (the last separator optional), into `bytes`, whose storage is
-// reused; false for anything else. Every triple is checked and decoded without a branch.
-bool decodeWriterHex(std::string_view text, std::vector<uint8_t>& bytes) {
-    const auto* at = reinterpret_cast<const uint8_t*>(text.data());
-    const size_t triples = text.size() / 3;
-    const size_t tail = text.size() % 3;  // 2: a last pair without its separator
-    if (tail == 1) return false;
-    bytes.resize(triples + tail / 2);
-    uint8_t* out = bytes.data();
-    int bad = 0;
-    for (size_t i = 0; i < triples; ++i, at += 3) {
-        const int byte = kHexPairs[at[0] | at[1] << 8];
-        bad |= byte | -static_cast<int>(at[2] != ' ');
-        out[i] = static_cast<uint8_t>(byte);
-    }
-    if (tail == 2) {
-        const int byte = kHexPairs[at[0] | at[1] << 8];
-        bad |= byte;
-        out[triples] = static_cast<uint8_t>(byte);
-    }
-    return bad >= 0;
-}
-
 // Any hex text the general reader takes; throws std::invalid_argument as it does.
 void decodeReportHex(std::string_view text, std::vector<uint8_t>& bytes) {
-    if (!decodeWriterHex(text, bytes)) bytes = Util::bytesFromHexString(std::string(text));
+    if (!ReportHex::decodeWriterForm(text, bytes)) bytes = Util::bytesFromHexString(std::string(text));
 }
 
 }  // namespace

@@ -1,6 +1,7 @@
 #pragma once
 // HIDEvent: one event handed to the host, a digitizer gesture or the vendor-defined reset notice.
-// A plain record shared by reference count; EventList holds the events that one report produced.
+// A plain record shared by reference count; EventList (its own header) holds the events that one
+// report produced.
 
 #include <cstdint>
 #include <memory>
@@ -63,9 +64,6 @@ struct HIDEvent {
 };
 
 using HIDEventRef = std::shared_ptr<HIDEvent>;
-
-// The ordered events of one report; holds a reference on each and drops it when it goes away.
-using EventList = std::vector<HIDEventRef>;
 
 // A digitizer event with the common defaults: finger, everything zero but mask, phase and y.
 HIDEventRef makeDigitizerEvent(uint32_t eventMask, uint32_t phase, double y);

@@ -20,6 +20,7 @@
 #include "pipeline/PipelineRecording.h"
 #include "platform/DispatchQueue.h"
 #include "platform/HIDDevice.h"
+#include "platform/EventList.h"
 #include "platform/HIDEvent.h"
 #include "platform/Log.h"
 #include "platform/PropertyValue.h"

@@ -1,6 +1,6 @@
 // Heap allocations of the recognizer per frame, counted exactly by replacing the global
 // allocation functions in this test program: a frame that gives no event allocates nothing, and a
-// frame that gives an event allocates that event only.
+// frame that gives an event allocates that event only, also through the list handleImage returns.
 
 #include <gtest/gtest.h>
 
@@ -47,10 +47,12 @@ struct FrameCost {
     uint64_t allocations;
 };
 
+enum class Path { ReusedList, HandleImage };
+
 // Idle, a tap, a hold in one region, a hold that slides to another region, a light brush that is
-// not a touch, and idle again; every frame through processTouchFrame into one list that is
-// emptied, not rebuilt, between frames.
-std::vector<FrameCost> costOfEachFrame() {
+// not a touch, and idle again; every frame either through processTouchFrame into one list that is
+// emptied, not rebuilt, between frames, or through handleImage, which makes a list per frame.
+std::vector<FrameCost> costOfEachFrame(Path path = Path::ReusedList) {
     SystemLog::setDebugEnabled(false, "Algs");
     Algs algs;
     Testing::TouchScript script(algs, 0, 0);
@@ -62,15 +64,21 @@ std::vector<FrameCost> costOfEachFrame() {
         .touch("H", 600, 3200, 3400)
         .ramp("C", 80, 240, 3800, 4184);
     EventList out;
-    out.reserve(4);
     std::vector<FrameCost> costs;
     costs.reserve(1000);
     for (uint32_t t = 0; t < 5000; t += Testing::kFramePeriodMs) {
         const InputReport::Image image = script.imageAt(t);
-        out.clear();
         const uint64_t before = allocationCount;
-        algs.processTouchFrame(image.pixels, t / Testing::kFramePeriodMs, t, out);
-        costs.push_back({algs.verdict().transition, out.size(), allocationCount - before});
+        size_t events = 0;
+        if (path == Path::ReusedList) {
+            out.clear();
+            algs.processTouchFrame(image.pixels, t / Testing::kFramePeriodMs, t, out);
+            events = out.size();
+        } else {
+            // The list is made and goes away within the frame, so its own cost is counted too.
+            events = algs.handleImage(image).size();
+        }
+        costs.push_back({algs.verdict().transition, events, allocationCount - before});
     }
     return costs;
 }
@@ -97,6 +105,15 @@ TEST(AlgsAllocationTest, FrameWithAnEventAllocatesTheEventOnly) {
         EXPECT_EQ(cost.allocations, 1u) << "transition " << static_cast<int>(cost.transition);
     }
     // May-begin, tap; may-begin, hold start, hold end (twice, with a hold change between).
+    EXPECT_GE(eventFrames, 8u);
+}
+
+TEST(AlgsAllocationTest, ListThatHandleImageReturnsCostsNothingBeyondTheEvent) {
+    size_t eventFrames = 0;
+    for (const FrameCost& cost : costOfEachFrame(Path::HandleImage)) {
+        EXPECT_EQ(cost.allocations, cost.events) << "transition " << static_cast<int>(cost.transition);
+        eventFrames += cost.events;
+    }
     EXPECT_GE(eventFrames, 8u);
 }
 

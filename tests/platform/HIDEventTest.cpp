@@ -93,19 +93,5 @@ TEST(HIDEventTest, FirmwareResetDescriptionNamesItsUsage) {
     EXPECT_EQ(event->description(), "VendorDefined timestamp=77 usagePage=0xFF60 usage=2 version=0 length=0 options=0");
 }
 
-TEST(HIDEventTest, EventListKeepsItsEventsAliveAndInOrder) {
-    std::weak_ptr<HIDEvent> watched;
-    {
-        EventList events;
-        events.push_back(makeDigitizerEvent(0, HIDEventPhase::MayBegin, 1.0));
-        events.push_back(makeVendorDefinedEvent(0xFF60, 2));
-        watched = events.front();
-        EXPECT_EQ(events[0]->type, HIDEventType::Digitizer);
-        EXPECT_EQ(events[1]->type, HIDEventType::VendorDefined);
-        EXPECT_FALSE(watched.expired());
-    }
-    EXPECT_TRUE(watched.expired());
-}
-
 }  // namespace
 }  // namespace TolkaTouch

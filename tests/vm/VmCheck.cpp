@@ -354,7 +354,7 @@ std::vector<KeyEvent> expectedKeys(const std::string& documentPath, const std::v
     std::chrono::nanoseconds clock{0};
     CollectingKeyOutput output(now);
     KeyMapper mapper(output, [&] { return clock; });
-    EventList pending;
+    std::vector<HIDEventRef> pending;
     pipeline.hidEventsProbe = [&](const EventList& events) { pending.insert(pending.end(), events.begin(), events.end()); };
 
     const auto& frames = recording.frames();
