@@ -1,5 +1,7 @@
 #include "algs/SVM.h"
 
+#include "algs/MachineVariants.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
@@ -35,19 +37,10 @@ constexpr std::array<Rank, SVM::kRankCount> kRanks{{
 
 constexpr size_t kRankCount = SVM::kRankCount;
 
-// The score's arithmetic in two machine variants picked once at load time: one for processors with
-// a fused multiply-add instruction and wide vectors, one for the rest. Both give the same bits: every
-// step is a single correctly rounded IEEE operation (subtract, divide, fused multiply-add), whichever
-// instructions carry it out. The thread sanitizer's runtime is not up yet when the loader picks a
-// variant, and its instrumented picker crashes there, so that build has only the default variant.
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) && !defined(__SANITIZE_THREAD__)
-#define TOLKA_SCORE_VARIANTS __attribute__((target_clones("arch=x86-64-v3", "default")))
-#else
-#define TOLKA_SCORE_VARIANTS
-#endif
-
+// The score's arithmetic in two machine variants: every step is a single correctly rounded IEEE
+// operation (subtract, divide, fused multiply-add), whichever instructions carry it out.
 // One fused multiply-add per rank, strongest first, onto the bias-free score.
-TOLKA_SCORE_VARIANTS
+TOLKA_MACHINE_VARIANTS
 float scoreOfRanked(const int32_t* ranked, const float* means, const float* scales, const float* weights) {
     std::array<float, kRankCount> standardized;
     for (size_t i = 0; i < kRankCount; ++i) standardized[i] = (static_cast<float>(ranked[i]) - means[i]) / scales[i];
@@ -55,8 +48,6 @@ float scoreOfRanked(const int32_t* ranked, const float* means, const float* scal
     for (size_t i = 0; i < kRankCount; ++i) score = std::fma(standardized[i], weights[i], score);
     return score;
 }
-
-#undef TOLKA_SCORE_VARIANTS
 
 // Largest first; equal values are interchangeable, so any correct sort gives the same list. In a
 // touch most elements read 0: the values above 0 go to the front and those below 0 to the back
