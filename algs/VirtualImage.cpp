@@ -1,6 +1,5 @@
 #include "algs/VirtualImage.h"
 
-#include "algs/MachineVariants.h"
 #include "tolkatouch/FrameSnapshot.h"
 
 #include <algorithm>
@@ -45,47 +44,6 @@ constexpr std::array<GroupMembers, kGroups.size()> membersOf() {
 }
 
 constexpr auto kMembers = membersOf();
-
-// The same members slot by slot across the groups, padded to whole vectors of eight groups: a
-// padding group has no members.
-constexpr size_t kPaddedGroups = (kGroups.size() + 7) / 8 * 8;
-using GroupRow = std::array<int32_t, kPaddedGroups>;
-
-constexpr std::array<GroupRow, 4> slotsOf() {
-    std::array<GroupRow, 4> slots{};
-    for (auto& slot : slots) slot.fill(kNoMember);
-    for (size_t g = 0; g < kGroups.size(); ++g) {
-        for (size_t k = 0; k < 4; ++k) slots[k][g] = kMembers[g].index[k];
-    }
-    return slots;
-}
-
-constexpr auto kSlots = slotsOf();
-
-// Every group's sum and strongest member at once, slot by slot across the groups, which the
-// compiler turns into vector code. For each group it makes the choices of the loop over its
-// members: a member above noise adds its value, and takes over as strongest when strictly stronger
-// than this frame's value of the one recorded (kept beside it as strongestValue). Every strongest
-// index must be a pixel's.
-TOLKA_MACHINE_VARIANTS
-void sumGroups(const std::array<int32_t, kPixelCount + 1>& pixelValue, GroupRow& strongest, GroupRow& sums) {
-    GroupRow strongestValue;
-    for (size_t g = 0; g < kPaddedGroups; ++g) {
-        strongestValue[g] = pixelValue[static_cast<size_t>(strongest[g])];
-        sums[g] = 0;
-    }
-    for (const GroupRow& slot : kSlots) {
-        for (size_t g = 0; g < kPaddedGroups; ++g) {
-            const int32_t i = slot[g];
-            const int32_t v = pixelValue[static_cast<size_t>(i)];
-            const bool aboveNoise = v >= Pixel::kNoiseLevel + 1;
-            const bool takesOver = aboveNoise & (v > strongestValue[g]);
-            sums[g] += aboveNoise ? v : 0;
-            strongest[g] = takesOver ? i : strongest[g];
-            strongestValue[g] = takesOver ? v : strongestValue[g];
-        }
-    }
-}
 
 // Element i with a range test: an index outside the vector raises the standard out-of-range
 // failure with the message "vector".
@@ -141,17 +99,6 @@ void VirtualImage::updateValues(std::span<const int32_t> pixels) {
         std::array<int32_t, kPixelCount + 1> pixelValue;
         std::copy(pixels.begin(), pixels.end(), pixelValue.begin());
         pixelValue[kNoMember] = 0;
-        GroupRow strongestRow{};
-        std::copy(strongest.begin(), strongest.end(), strongestRow.begin());
-        if (std::all_of(strongest.begin(), strongest.end(),
-                        [](int32_t i) { return static_cast<uint32_t>(i) < kPixelCount; })) {
-            GroupRow sums;
-            sumGroups(pixelValue, strongestRow, sums);
-            std::copy_n(sums.begin(), kGroups.size(), values.begin());
-            std::copy_n(strongestRow.begin(), kGroups.size(), strongest.begin());
-            return;
-        }
-        // A strongest index that is not a pixel's (set by hand): group by group.
         for (size_t g = 0; g < kGroups.size(); ++g) {
             const GroupMembers& members = kMembers[g];
             uint32_t strongestIndex = static_cast<uint32_t>(strongest[g]);
