@@ -29,18 +29,23 @@ uint64_t factorIndex(const std::string& text) {
     return index;
 }
 
-template <size_t... I>
-std::array<Pixel, sizeof...(I)> makePixels(std::index_sequence<I...>) {
-    return {Pixel(static_cast<int>(I), Algs::pixelGains[I])...};
+RealPixels makePixels() {
+    std::array<int32_t, kPixelCount> indices;
+    for (size_t i = 0; i < kPixelCount; ++i) indices[i] = static_cast<int32_t>(i);
+    return RealPixels(Algs::pixelGains, indices);
 }
 
 // The factor is copied into the virtual pixel: a later "VirtualNormalizationFactors" change
 // reaches the virtual image's list only. The index starts as the first letter's character code;
 // the first frame replaces it with the strongest member's pixel index.
-template <size_t... I>
-std::array<VirtualPixel, sizeof...(I)> makeVirtualPixels(const VirtualImage& image, std::index_sequence<I...>) {
-    return {VirtualPixel(static_cast<int>(static_cast<signed char>(image.groups.at(I)[0])),
-                         image.normalizationFactors.at(I), image.groups.at(I))...};
+VirtualPixels makeVirtualPixels(const VirtualImage& image) {
+    std::array<float, kVirtualPixelCount> gains;
+    std::array<int32_t, kVirtualPixelCount> indices;
+    for (size_t i = 0; i < kVirtualPixelCount; ++i) {
+        gains[i] = image.normalizationFactors.at(i);
+        indices[i] = static_cast<int32_t>(static_cast<signed char>(image.groups.at(i)[0]));
+    }
+    return VirtualPixels(gains, indices);
 }
 
 }  // namespace
@@ -48,8 +53,8 @@ std::array<VirtualPixel, sizeof...(I)> makeVirtualPixels(const VirtualImage& ima
 // The virtual image, hand state and counters are built by their own defaults.
 Algs::Algs()
     : log(kSubsystem, kCategory),
-      pixels(makePixels(std::make_index_sequence<kPixelCount>())),
-      virtualPixels(makeVirtualPixels(virtualImage, std::make_index_sequence<kVirtualPixelCount>())) {}
+      pixels(makePixels()),
+      virtualPixels(makeVirtualPixels(virtualImage)) {}
 
 EventList Algs::handleImage(const InputReport::Image& image) {
     EventList out;
@@ -68,23 +73,24 @@ void Algs::processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint
     const float threshold = handStats.ActivationThreshold;
 
     // 1. The real pixels, in index order.
-    for (size_t i = 0; i < kPixelCount; ++i) pixels[i].updatePixelState(readings[i], threshold);
+    std::array<int16_t, kPixelCount> raw;
+    std::copy(readings, readings + kPixelCount, raw.begin());
+    pixels.update(raw, threshold);
 
     // 2. The group sums.
-    virtualImage.updateValues(pixels);
+    virtualImage.updateValues(std::span(pixels.value).first<kPixelCount>());
 
     // 3. The virtual pixels. The group sum is narrowed to 16 bits, so one above 32767 wraps to a
     // negative value; the tuned factors and thresholds expect exactly that.
     if (virtualImage.values.size() < kVirtualPixelCount || virtualImage.strongest.size() < kVirtualPixelCount) {
         throw std::out_of_range("vector");
     }
-    for (size_t i = 0; i < kVirtualPixelCount; ++i) {
-        const int value = static_cast<int16_t>(virtualImage.values[i]);
-        virtualPixels[i].updatePixelState(value, threshold, virtualImage.strongest[i]);
-    }
+    std::array<int16_t, kVirtualPixelCount> sums;
+    for (size_t i = 0; i < kVirtualPixelCount; ++i) sums[i] = static_cast<int16_t>(virtualImage.values[i]);
+    virtualPixels.update(sums, threshold);
+    std::copy_n(virtualImage.strongest.begin(), kVirtualPixelCount, virtualPixels.index.begin());
 
-    // 4. The hand state machine reads this frame's snapshot of both pixel lists, and decides once
-    // what the frame did.
+    // 4. The hand state machine reads both pixel rows, and decides once what the frame did.
     handStats.updateHandState(pixels, virtualPixels, timeMs);
     _verdict = handStats.verdict();
     std::copy(readings, readings + kPixelCount, _readings.begin());
@@ -137,8 +143,8 @@ HIDEventRef Algs::eventFor(const FrameVerdict& verdict) {
 }
 
 void Algs::Reset() {
-    for (Pixel& pixel : pixels) pixel.resetGlobalStats();
-    for (VirtualPixel& pixel : virtualPixels) pixel.resetGlobalStats();
+    pixels.resetGlobalStats();
+    virtualPixels.resetGlobalStats();
     handStats.Reset();
 }
 
@@ -186,14 +192,14 @@ FrameSnapshot Algs::snapshotOf(const int16_t* readings, uint32_t frameNumber, ui
     frame.timeMs = timeMs;
     for (size_t i = 0; i < kPixelCount; ++i) {
         frame.readings[i] = readings[i];
-        frame.pixelValues[i] = pixels[i].value;
-        frame.pixelNormalized[i] = pixels[i].normalized;
-        frame.pixelOn[i] = pixels[i].isOn;
+        frame.pixelValues[i] = pixels.value[i];
+        frame.pixelNormalized[i] = pixels.normalized[i];
+        frame.pixelOn[i] = pixels.isOn[i] != 0;
     }
     for (size_t i = 0; i < kVirtualPixelCount; ++i) {
-        frame.virtualValues[i] = virtualPixels[i].value;
-        frame.virtualNormalized[i] = virtualPixels[i].normalized;
-        frame.virtualOn[i] = virtualPixels[i].isOn;
+        frame.virtualValues[i] = virtualPixels.value[i];
+        frame.virtualNormalized[i] = virtualPixels.normalized[i];
+        frame.virtualOn[i] = virtualPixels.isOn[i] != 0;
     }
     frame.touchScore = hand.touchScore;
     frame.svmScore = hand.svm.score;

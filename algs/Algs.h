@@ -11,6 +11,7 @@
 #include "algs/EventStats.h"
 #include "algs/HandStats.h"
 #include "algs/Pixel.h"
+#include "algs/PixelBank.h"
 #include "algs/VirtualImage.h"
 #include "algs/VirtualPixel.h"
 #include "common/Reports.h"
@@ -61,9 +62,10 @@ public:
 
     // The recognizer's state, open for inspection.
     Log log;
-    std::array<Pixel, kPixelCount> pixels;                      // A..O
-    VirtualImage virtualImage;                                  // the groups, their sums and factors
-    std::array<VirtualPixel, kVirtualPixelCount> virtualPixels;  // one per group, in group order
+    // The pixels are kept field by field, so that a frame updates each row as vector operations.
+    RealPixels pixels;            // A..O
+    VirtualImage virtualImage;    // the groups, their sums and factors
+    VirtualPixels virtualPixels;  // one per group, in group order; named by virtualPixelName
     HandStats handStats;                      // also holds the tuning settings
     EventStats eventStats;
     int16_t lastEventPhase = 0;  // phase of the last event emitted

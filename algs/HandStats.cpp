@@ -4,6 +4,8 @@
 #include <cmath>
 #include <limits>
 #include <stdexcept>
+#include <tuple>
+#include <type_traits>
 #include <utility>
 
 namespace TolkaTouch {
@@ -14,24 +16,20 @@ constexpr float kE2 = 7.389056f;
 
 size_t slot(PixelRegion region) { return static_cast<size_t>(region); }
 
-// Element i with a range test, failing as the standard containers' range test does.
-template <typename T>
-const T& elementAt(std::span<const T> elements, size_t i) {
-    if (i >= elements.size()) throw std::out_of_range("vector");
-    return elements[i];
-}
-
 // Order key of the region sort: largest maxNormalizedAboveNoise first. A key that is not a number
 // (only with a divisor that is not one) sorts last, so the order stays a strict weak one.
-float sortKey(const Pixel& pixel) {
-    const float key = pixel.maxNormalizedAboveNoise;
-    return std::isnan(key) ? -std::numeric_limits<float>::infinity() : key;
+float sortKey(float maxNormalizedAboveNoise) {
+    return std::isnan(maxNormalizedAboveNoise) ? -std::numeric_limits<float>::infinity() : maxNormalizedAboveNoise;
 }
 
 // The region sort's order: largest key first, equal keys in ascending index order.
+bool precedes(float keyA, int32_t indexA, float keyB, int32_t indexB) {
+    if (sortKey(keyA) != sortKey(keyB)) return sortKey(keyA) > sortKey(keyB);
+    return indexA < indexB;
+}
+
 bool precedes(const Pixel& a, const Pixel& b) {
-    if (sortKey(a) != sortKey(b)) return sortKey(a) > sortKey(b);
-    return a.index < b.index;
+    return precedes(a.maxNormalizedAboveNoise, a.index, b.maxNormalizedAboveNoise, b.index);
 }
 
 }  // namespace
@@ -53,6 +51,25 @@ std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::spa
     return {first, second};
 }
 
+std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pixels) {
+    const auto before = [&](size_t a, size_t b) {
+        return precedes(pixels.maxNormalizedAboveNoise[a], pixels.index[a], pixels.maxNormalizedAboveNoise[b],
+                        pixels.index[b]);
+    };
+    size_t first = 0;
+    size_t second = 1;
+    if (before(second, first)) std::swap(first, second);
+    for (size_t i = 2; i < pixels.size(); ++i) {
+        if (before(i, first)) {
+            second = first;
+            first = i;
+        } else if (before(i, second)) {
+            second = i;
+        }
+    }
+    return {first, second};
+}
+
 HandStats::HandStats() = default;
 
 void HandStats::SetDecayParameters() { decayBase = kE2; }
@@ -66,30 +83,89 @@ void HandStats::Reset() {
 
 void HandStats::updateHandState(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                                 unsigned int time) {
+    updateHandState(RealPixels::of(pixels), VirtualPixels::of(virtualPixels), time);
+}
+
+void HandStats::updateTouchScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
+                                 unsigned int time) {
+    updateTouchScore(RealPixels::of(pixels), VirtualPixels::of(virtualPixels), time);
+}
+
+void HandStats::updateRegionMax(std::span<const Pixel> pixels) { updateRegionMax(RealPixels::of(pixels)); }
+
+PixelRegion HandStats::updateActiveRegion(std::span<const Pixel> pixels,
+                                          std::span<const VirtualPixel> virtualPixels, unsigned int time) {
+    return updateActiveRegion(RealPixels::of(pixels), VirtualPixels::of(virtualPixels), time);
+}
+
+PixelRegion HandStats::changeActiveRegion(std::span<const Pixel> pixels, int index) {
+    return changeActiveRegion(RealPixels::of(pixels), index);
+}
+
+void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels) {
+    updateTapRejection(RealPixels::of(pixels), VirtualPixels::of(virtualPixels));
+}
+
+void HandStats::updateHandState(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time) {
     // 1. Scan the real pixels, then the virtual ones: the strongest on element since the last
     // Reset, whether anything is on or above noise, and this frame's strongest element.
-    // Kept in locals and stored once: the pixels are floats too, so stores to members inside the
-    // loop would make every pixel be read again.
-    bool someOn = false;
-    bool someAboveNoise = false;
-    float strongestStrength = 0.0f;
-    int32_t strongestIndex = 0;
+    // Read as the rows' maxima first, eight lanes at a time, which the compiler turns into vector
+    // code: with s = max(normalized, 0), this frame's strongest element is the first whose s is
+    // the largest s (when above 0), and the strongest on element the first on one whose s is the
+    // largest on s (when above the record). That is what a scan keeping each strictly stronger
+    // element finds; not-a-number strengths never win either way. Padding lanes are never on and
+    // their s is never above 0.
+    constexpr float kNone = -std::numeric_limits<float>::infinity();
+    std::array<float, 8> strongestLanes{};
+    std::array<float, 8> strongestOnLanes;
+    strongestOnLanes.fill(kNone);
+    int32_t someOnLanes = 0;
+    int32_t someAboveNoiseLanes = 0;
+    const auto maxima = [&](const auto& row) {
+        static_assert(std::remove_cvref_t<decltype(row)>::kLanes == 8);
+        for (size_t b = 0; b < row.normalized.size(); b += 8) {
+            for (size_t j = 0; j < 8; ++j) {
+                const float s = std::max(row.normalized[b + j], 0.0f);
+                const int32_t on = row.isOn[b + j];
+                strongestLanes[j] = std::max(strongestLanes[j], s);
+                strongestOnLanes[j] = std::max(strongestOnLanes[j], on != 0 ? s : kNone);
+                someOnLanes |= on;
+                someAboveNoiseLanes |= row.aboveNoise[b + j];
+            }
+        }
+    };
+    maxima(pixels);
+    maxima(virtualPixels);
+    float strongest = 0.0f;
+    float strongestOn = kNone;
+    for (size_t j = 0; j < 8; ++j) {
+        strongest = std::max(strongest, strongestLanes[j]);
+        strongestOn = std::max(strongestOn, strongestOnLanes[j]);
+    }
+    const bool someOn = someOnLanes != 0;
+    const bool someAboveNoise = someAboveNoiseLanes != 0;
+
+    // The first element, real pixels then virtual ones, whose s equals m (among the on ones only
+    // when onOnly): its index and its own s.
+    const auto firstAt = [&](float m, bool onOnly) -> std::pair<int32_t, float> {
+        const auto search = [&](const auto& row, std::pair<int32_t, float>& found) {
+            for (size_t i = 0; i < row.size(); ++i) {
+                const float s = std::max(row.normalized[i], 0.0f);
+                if (s == m && (!onOnly || row.isOn[i] != 0)) {
+                    found = {row.index[i], s};
+                    return true;
+                }
+            }
+            return false;
+        };
+        std::pair<int32_t, float> found{0, 0.0f};
+        if (!search(pixels, found)) search(virtualPixels, found);
+        return found;
+    };
+    const int32_t strongestIndex = strongest > 0.0f ? firstAt(strongest, false).first : 0;
     float maxOn = maxOnStrength;
     int32_t maxOnAt = maxOnIndex;
-    const auto scan = [&](const Pixel& pixel) {
-        const float s = std::max(pixel.normalized, 0.0f);
-        const bool on = pixel.isOn;
-        const bool strongerOn = on && s > maxOn;
-        maxOnAt = strongerOn ? pixel.index : maxOnAt;
-        maxOn = strongerOn ? s : maxOn;
-        someOn |= on;
-        someAboveNoise |= pixel.aboveNoise;
-        const bool stronger = s > strongestStrength;
-        strongestIndex = stronger ? pixel.index : strongestIndex;
-        strongestStrength = stronger ? s : strongestStrength;
-    };
-    for (const Pixel& pixel : pixels) scan(pixel);
-    for (const VirtualPixel& pixel : virtualPixels) scan(pixel);
+    if (strongestOn > maxOn) std::tie(maxOnAt, maxOn) = firstAt(strongestOn, true);
     maxOnStrength = maxOn;
     maxOnIndex = maxOnAt;
 
@@ -206,8 +282,7 @@ FrameVerdict HandStats::verdict() const {
     return verdict;
 }
 
-void HandStats::updateTouchScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
-                                 unsigned int time) {
+void HandStats::updateTouchScore(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time) {
     // 1.
     svm.updateSVMScore(pixels, virtualPixels, ActivationThreshold);
     // 2. Noise that returns right after ending keeps part of the score.
@@ -247,24 +322,24 @@ float HandStats::fuzzifyAndClip(float x, float x0, float x1, float y0, float y1)
     return fuzzify(x, x0, x1, y0, y1);
 }
 
-void HandStats::updateRegionMax(std::span<const Pixel> pixels) {
+void HandStats::updateRegionMax(const RealPixels& pixels) {
     std::fill(regionMax.begin(), regionMax.end(), 0.0f);
-    for (const Pixel& pixel : pixels) {
-        const PixelRegion r = pixelRegionOfIndex(pixel.index);
-        const float excess = static_cast<float>(pixel.value) - 75.0f;
+    for (size_t i = 0; i < pixels.size(); ++i) {
+        const PixelRegion r = pixelRegionOfIndex(pixels.index[i]);
+        const float excess = static_cast<float>(pixels.value[i]) - 75.0f;
         if (excess > 0.0f && r != PixelRegion::None) regionMax[slot(r)] = std::max(regionMax[slot(r)], excess);
     }
 }
 
-PixelRegion HandStats::updateActiveRegion(std::span<const Pixel> pixels,
-                                          std::span<const VirtualPixel> virtualPixels, unsigned int time) {
+PixelRegion HandStats::updateActiveRegion(const RealPixels& pixels, const VirtualPixels& virtualPixels,
+                                          unsigned int time) {
     // 1. The region of the strongest on element since the last Reset.
     PixelRegion r = pixelRegionOfIndex(maxOnIndex);
 
     // 2. The two pixels strongest above noise over this touch; equal keys keep index order.
-    const auto [firstPixel, secondPixel] = twoFirstByMaxNormalizedAboveNoise(pixels);
-    const Pixel& first = *firstPixel;
-    const Pixel& second = *secondPixel;
+    const auto [firstAt, secondAt] = twoFirstByMaxNormalizedAboveNoise(pixels);
+    const Pixel first = pixels.pixel(firstAt);
+    const Pixel second = pixels.pixel(secondAt);
 
     // 3. Soon after a tap or hold end the last event's region is favoured.
     const float b = updateTimeBiasFactor(time);
@@ -285,13 +360,13 @@ PixelRegion HandStats::updateActiveRegion(std::span<const Pixel> pixels,
     constexpr size_t kGroupIJK = 18;
     constexpr size_t kGroupKLM = 19;
     if (maxOnIndex == kPixelK && second.maxNormalizedAboveNoise > noiseLevel && first.index == kPixelK) {
-        const float centre = elementAt(pixels, kPixelK).maxNormalizedAboveNoise;
+        const float centre = pixels.maxNormalizedAboveNoise[kPixelK];
         if (second.index == kPixelM) {
             const float f = eventRegion == PixelRegion::VolumeDown ? std::min(b, 0.7f) : 0.7f;
-            if (elementAt(virtualPixels, kGroupKLM).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeDown;
+            if (virtualPixels.maxNormalizedAboveNoise[kGroupKLM] > f * centre) r = PixelRegion::VolumeDown;
         } else if (second.index == kPixelI) {
             const float f = eventRegion == PixelRegion::VolumeUp ? std::min(b, 0.7f) : 0.7f;
-            if (elementAt(virtualPixels, kGroupIJK).maxNormalizedAboveNoise > f * centre) r = PixelRegion::VolumeUp;
+            if (virtualPixels.maxNormalizedAboveNoise[kGroupIJK] > f * centre) r = PixelRegion::VolumeUp;
         }
     }
 
@@ -300,7 +375,7 @@ PixelRegion HandStats::updateActiveRegion(std::span<const Pixel> pixels,
     return r;
 }
 
-PixelRegion HandStats::changeActiveRegion(std::span<const Pixel> pixels, int index) {
+PixelRegion HandStats::changeActiveRegion(const RealPixels& pixels, int index) {
     // 1.
     previousActiveRegion = activeRegion;
     const PixelRegion c = activeRegion;
@@ -331,7 +406,7 @@ PixelRegion HandStats::changeActiveRegion(std::span<const Pixel> pixels, int ind
     return regionMax[slot(n)] / mNow >= k * q ? n : c;
 }
 
-void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels) {
+void HandStats::updateTapRejection(const RealPixels& pixels, const VirtualPixels& virtualPixels) {
     // 1.
     peakStrength = maxOnStrength * ActivationThreshold;
 
@@ -353,8 +428,10 @@ void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<cons
 
     // 4. Elements above noise that were never on during the touch.
     int32_t nonActive = 0;
-    for (const Pixel& pixel : pixels) nonActive += pixel.wasAboveNoise && !pixel.wasOn;
-    for (const VirtualPixel& pixel : virtualPixels) nonActive += pixel.wasAboveNoise && !pixel.wasOn;
+    for (size_t i = 0; i < pixels.size(); ++i) nonActive += pixels.wasAboveNoise[i] & (pixels.wasOn[i] ^ 1);
+    for (size_t i = 0; i < virtualPixels.size(); ++i) {
+        nonActive += virtualPixels.wasAboveNoise[i] & (virtualPixels.wasOn[i] ^ 1);
+    }
 
     // 5., 6.
     activePixelCount = 21 - nonActive;

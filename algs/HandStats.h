@@ -9,6 +9,7 @@
 #include <utility>
 
 #include "algs/Pixel.h"
+#include "algs/PixelBank.h"
 #include "algs/SVM.h"
 #include "algs/VirtualPixel.h"
 #include "common/Reports.h"
@@ -20,6 +21,8 @@ namespace TolkaTouch {
 // keys in ascending index order (a key that is not a number last). Found in one pass, without
 // sorting a copy. Throws std::out_of_range("vector") for fewer than two pixels.
 std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels);
+// The same order over a bank's elements, as their positions in it.
+std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pixels);
 
 class HandStats {
 public:
@@ -34,19 +37,27 @@ public:
     // counters and the description are chosen. Read it after updateHandState.
     FrameVerdict verdict() const;
 
-    // One frame at the firmware time `time` (ms). The pixels are this frame's snapshot; they are
-    // only read.
-    void updateHandState(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
-                         unsigned int time);
+    // One frame at the firmware time `time` (ms). The pixels are this frame's; they are only read.
+    void updateHandState(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time);
 
-    void updateTouchScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
-                          unsigned int time);
+    void updateTouchScore(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time);
     void decayTouchScore(unsigned int time);
     float updateTimeBiasFactor(unsigned int time);
     float fuzzify(float x, float x0, float x1, float y0, float y1);
     float fuzzifyAndClip(float x, float x0, float x1, float y0, float y1);
 
     // Active region and tap rejection.
+    void updateRegionMax(const RealPixels& pixels);
+    PixelRegion updateActiveRegion(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time);
+    PixelRegion changeActiveRegion(const RealPixels& pixels, int index);
+    void updateTapRejection(const RealPixels& pixels, const VirtualPixels& virtualPixels);
+
+    // The same steps on pixels given one by one: the surface's 15 and 23, else they throw
+    // std::out_of_range("vector").
+    void updateHandState(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
+                         unsigned int time);
+    void updateTouchScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
+                          unsigned int time);
     void updateRegionMax(std::span<const Pixel> pixels);
     PixelRegion updateActiveRegion(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                                    unsigned int time);

@@ -45,45 +45,66 @@ public:
 namespace PixelDetail {
 
 // Truncation toward zero. The product of a fixed gain and a 16-bit reading always fits; anything
-// else (a gain that is not a number, or huge) saturates instead of overflowing.
+// else (a gain that is not a number, or huge) saturates instead of overflowing. Written with
+// selects, not branches, so that a loop of them becomes vector code: the conversion only ever sees
+// a number inside the 32-bit range.
 inline int32_t truncateToInt32(float x) {
-    if (std::isnan(x)) return 0;
-    if (x >= 2147483648.0f) return INT32_MAX;
-    if (x <= -2147483648.0f) return INT32_MIN;
-    return static_cast<int32_t>(x);
+    const bool high = x >= 2147483648.0f;
+    const bool low = x <= -2147483648.0f;
+    const bool inRange = (x > -2147483648.0f) & (x < 2147483648.0f);  // false for not-a-number
+    const int32_t truncated = static_cast<int32_t>(inRange ? x : 0.0f);
+    return high ? INT32_MAX : low ? INT32_MIN : truncated;
+}
+
+// One element's frame (the steps of Pixel::updatePixelState), on its fields wherever they live:
+// in a Pixel, or at one index of a PixelBank's rows. Every field is assigned by a select rather
+// than under a branch, so that a loop over many elements becomes vector code; each step is one
+// IEEE operation, which gives the same bits in a vector lane as in a scalar register. A flag is a
+// bool in a Pixel and a 32-bit 0 or 1 in a bank, a width the vectoriser handles beside floats.
+template <typename Flag>
+inline void updateElement(int raw, float divisor, float gain, int32_t& value, float& normalized, float& peak,
+                          float& valley, Flag& isOn, Flag& aboveNoise, Flag& wasAboveNoise, Flag& wasOn,
+                          float& maxNormalizedAboveNoise) {
+    constexpr float kHysteresis = Pixel::kHysteresis;
+    constexpr int32_t kNoiseLevel = Pixel::kNoiseLevel;
+
+    // 1. Scale.
+    const int32_t v = truncateToInt32(gain * static_cast<float>(raw));
+
+    // 2. Threshold from last frame's state: off at 60 % of the peak; on above valley / 0.6, but
+    // never at a normalised value of 1.0 or less.
+    const float offThreshold = peak * kHysteresis;
+    const float onThreshold = std::max(valley / kHysteresis, 1.0f);
+    const float threshold = isOn != 0 ? offThreshold : onThreshold;
+
+    // 3. Normalise; 4. decide.
+    const float n = static_cast<float>(v) / divisor;
+    const bool on = n > threshold;
+
+    // 5. Follow the peak while on, the valley while off.
+    const float peakIfOn = std::max(n, peak);
+    const float valleyIfOff = std::min(n, valley);
+    peak = on ? peakIfOn : n;
+    valley = on ? n : valleyIfOff;
+    wasOn = static_cast<Flag>(wasOn | on);
+
+    // 6., 7. Noise statistics.
+    const bool above = v > kNoiseLevel;
+    const float maxIfAbove = std::max(n, maxNormalizedAboveNoise);
+    maxNormalizedAboveNoise = above ? maxIfAbove : maxNormalizedAboveNoise;
+    wasAboveNoise = static_cast<Flag>(wasAboveNoise | above);
+    aboveNoise = static_cast<Flag>(above);
+    value = v;
+    normalized = n;
+    isOn = static_cast<Flag>(on);
 }
 
 }  // namespace PixelDetail
 
 // Inline: it runs for 38 elements every frame, and the call would cost as much as the work.
 inline void Pixel::updatePixelState(int raw, float divisor) {
-    // 1. Scale.
-    value = PixelDetail::truncateToInt32(gain * static_cast<float>(raw));
-
-    // 2. Threshold from last frame's state: off at 60 % of the peak; on above valley / 0.6, but
-    // never at a normalised value of 1.0 or less.
-    const float threshold = isOn ? peak * kHysteresis : std::max(valley / kHysteresis, 1.0f);
-
-    // 3. Normalise; 4. decide.
-    normalized = static_cast<float>(value) / divisor;
-    isOn = normalized > threshold;
-
-    // 5. Follow the peak while on, the valley while off.
-    if (isOn) {
-        peak = std::max(normalized, peak);
-        valley = normalized;
-        wasOn = true;
-    } else {
-        peak = normalized;
-        valley = std::min(normalized, valley);
-    }
-
-    // 6., 7. Noise statistics.
-    aboveNoise = value > kNoiseLevel;
-    if (value >= kNoiseLevel + 1) {
-        wasAboveNoise = true;
-        maxNormalizedAboveNoise = std::max(normalized, maxNormalizedAboveNoise);
-    }
+    PixelDetail::updateElement(raw, divisor, gain, value, normalized, peak, valley, isOn, aboveNoise, wasAboveNoise,
+                               wasOn, maxNormalizedAboveNoise);
 }
 
 }  // namespace TolkaTouch

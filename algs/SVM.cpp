@@ -1,5 +1,7 @@
 #include "algs/SVM.h"
 
+#include "algs/MachineVariants.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
@@ -35,19 +37,10 @@ constexpr std::array<Rank, SVM::kRankCount> kRanks{{
 
 constexpr size_t kRankCount = SVM::kRankCount;
 
-// The score's arithmetic in two machine variants picked once at load time: one for processors with
-// a fused multiply-add instruction and wide vectors, one for the rest. Both give the same bits: every
-// step is a single correctly rounded IEEE operation (subtract, divide, fused multiply-add), whichever
-// instructions carry it out. The thread sanitizer's runtime is not up yet when the loader picks a
-// variant, and its instrumented picker crashes there, so that build has only the default variant.
-#if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) && !defined(__SANITIZE_THREAD__)
-#define TOLKA_SCORE_VARIANTS __attribute__((target_clones("arch=x86-64-v3", "default")))
-#else
-#define TOLKA_SCORE_VARIANTS
-#endif
-
+// The score's arithmetic in two machine variants: every step is a single correctly rounded IEEE
+// operation (subtract, divide, fused multiply-add), whichever instructions carry it out.
 // One fused multiply-add per rank, strongest first, onto the bias-free score.
-TOLKA_SCORE_VARIANTS
+TOLKA_MACHINE_VARIANTS
 float scoreOfRanked(const int32_t* ranked, const float* means, const float* scales, const float* weights) {
     std::array<float, kRankCount> standardized;
     for (size_t i = 0; i < kRankCount; ++i) standardized[i] = (static_cast<float>(ranked[i]) - means[i]) / scales[i];
@@ -56,7 +49,44 @@ float scoreOfRanked(const int32_t* ranked, const float* means, const float* scal
     return score;
 }
 
-#undef TOLKA_SCORE_VARIANTS
+// Largest first; equal values are interchangeable, so any correct sort gives the same list. In a
+// touch most elements read 0: the values above 0 go to the front and those below 0 to the back
+// without branches, the zeros fill the middle, and only the few on either side are sorted. No
+// allocation: std::sort works in place.
+void sortDescending(std::array<int32_t, kRankCount>& values, size_t count) {
+    std::array<int32_t, kRankCount> split{};
+    size_t positive = 0;
+    size_t negative = 0;
+    for (size_t i = 0; i < count; ++i) {
+        const int32_t v = values[i];
+        split[positive] = v;
+        positive += v > 0;
+    }
+    for (size_t i = 0; i < count; ++i) {
+        const int32_t v = values[i];
+        split[count - 1 - negative] = v;
+        negative += v < 0;
+    }
+    // The slots between hold 0 or a stale copy; they are all zeros.
+    std::fill(split.begin() + static_cast<std::ptrdiff_t>(positive),
+              split.begin() + static_cast<std::ptrdiff_t>(count - negative), 0);
+    std::copy_n(split.begin(), count, values.begin());
+    std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(positive), std::greater<int32_t>());
+    std::sort(values.begin() + static_cast<std::ptrdiff_t>(count - negative),
+              values.begin() + static_cast<std::ptrdiff_t>(count), std::greater<int32_t>());
+}
+
+// Whether a frame is scored: something converts above the gate, or two values are at noise or
+// above. Counted, not branched on, so that the loop becomes vector code.
+bool worthScoring(const int32_t* values, size_t count, float gate) {
+    int32_t aboveGate = 0;
+    int32_t aboveNoise = 0;
+    for (size_t i = 0; i < count; ++i) {
+        aboveGate |= static_cast<int32_t>(static_cast<float>(values[i]) > gate);
+        aboveNoise += static_cast<int32_t>(values[i] >= Pixel::kNoiseLevel + 1);
+    }
+    return aboveGate != 0 || aboveNoise >= 2;
+}
 
 }  // namespace
 
@@ -81,27 +111,32 @@ void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualP
     size_t n = 0;
     for (const Pixel& p : pixels) values[n++] = p.value;
     for (const VirtualPixel& p : virtualPixels) values[n++] = p.value;
+    scoreValues(values, count, gate);
+}
 
+void SVM::updateSVMScore(const RealPixels& pixels, const VirtualPixels& virtualPixels, float gate) {
+    static_assert(RealPixels::size() + VirtualPixels::size() == kRankCount);
+    score = 0.0f;
+    std::array<int32_t, kRankCount> values;
+    std::copy_n(pixels.value.begin(), RealPixels::size(), values.begin());
+    std::copy_n(virtualPixels.value.begin(), VirtualPixels::size(), values.begin() + RealPixels::size());
+    scoreValues(values, kRankCount, gate);
+}
+
+void SVM::scoreValues(std::array<int32_t, kRankCount>& values, size_t count, float gate) {
     // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
     // sort. Rank 0 above the gate means some value converts above it (the conversion keeps
     // order); rank 1 at noise or above means two values are.
-    bool aboveGate = false;
-    size_t aboveNoise = 0;
-    for (size_t i = 0; i < count; ++i) {
-        aboveGate |= static_cast<float>(values[i]) > gate;
-        aboveNoise += values[i] >= Pixel::kNoiseLevel + 1;
-    }
-    if (!aboveGate && aboveNoise < 2) return;
+    if (!worthScoring(values.data(), count, gate)) return;
 
     if (count == kRankCount) {
         // 3., 5. The surface's 38 elements.
-        // 3. Largest first; equal values are interchangeable here. A sort of 38 in place: one
-        // partition, then insertion runs, no allocation.
-        std::sort(values.begin(), values.end(), std::greater<int32_t>());
+        // 3. Largest first.
+        sortDescending(values, kRankCount);
         score = scoreOfRanked(values.data(), means.data(), scales.data(), weights.data());
     } else {
         // Fewer elements than ranks: the first `count` ranks, in the same order of operations.
-        std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(count), std::greater<int32_t>());
+        sortDescending(values, count);
         for (size_t i = 0; i < count; ++i) {
             score = std::fma((static_cast<float>(values[i]) - means[i]) / scales[i], weights[i], score);
         }

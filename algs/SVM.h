@@ -7,6 +7,7 @@
 #include <span>
 
 #include "algs/Pixel.h"
+#include "algs/PixelBank.h"
 #include "algs/VirtualPixel.h"
 
 namespace TolkaTouch {
@@ -22,6 +23,8 @@ public:
     // Throws std::out_of_range("vector") unless the two lists hold between 2 and 38 elements.
     void updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualPixel> virtualPixels,
                         float gate);
+    // The same over the surface's 15 real and 23 virtual pixels.
+    void updateSVMScore(const RealPixels& pixels, const VirtualPixels& virtualPixels, float gate);
     float getSVMScore() const { return score; }
 
     float score = 0.0f;
@@ -29,6 +32,10 @@ public:
     std::array<float, kRankCount> scales;   // per rank, divided by
     std::array<float, kRankCount> weights;  // per rank
     float bias = 2.0083f;
+
+private:
+    // The score of `count` (2..38) element values, which it reorders.
+    void scoreValues(std::array<int32_t, kRankCount>& values, size_t count, float gate);
 };
 
 }  // namespace TolkaTouch

@@ -76,15 +76,28 @@ VirtualImage::VirtualImage() {
 }
 
 void VirtualImage::updateValues(std::span<const Pixel> pixels) {
+    std::array<int32_t, kPixelCount> row;
+    if (pixels.size() == kPixelCount) {
+        for (size_t i = 0; i < kPixelCount; ++i) row[i] = pixels[i].value;
+        updateValues(row);
+        return;
+    }
+    // Any other number of pixels: only the values are read.
+    std::vector<int32_t> values(pixels.size());
+    for (size_t i = 0; i < pixels.size(); ++i) values[i] = pixels[i].value;
+    updateValues(values);
+}
+
+void VirtualImage::updateValues(std::span<const int32_t> pixels) {
     // 1. Sums start afresh; the strongest members carry over from the last frame.
     std::fill(values.begin(), values.end(), 0);
 
     // The surface's own 15 pixels and the fixed groups: the members were looked up once, and the
-    // pixels' values are read into one row first.
+    // pixels' values are read into one row with a slot for "no member" first.
     if (pixels.size() == kPixelCount && groups.size() == kGroups.size() && values.size() == kGroups.size() &&
         strongest.size() == kGroups.size()) {
         std::array<int32_t, kPixelCount + 1> pixelValue;
-        for (size_t i = 0; i < kPixelCount; ++i) pixelValue[i] = pixels[i].value;
+        std::copy(pixels.begin(), pixels.end(), pixelValue.begin());
         pixelValue[kNoMember] = 0;
         for (size_t g = 0; g < kGroups.size(); ++g) {
             const GroupMembers& members = kMembers[g];
@@ -117,11 +130,11 @@ void VirtualImage::updateValues(std::span<const Pixel> pixels) {
     for (size_t g = 0; g < groups.size(); ++g) {
         for (const char letter : groups[g]) {
             const size_t i = static_cast<size_t>(letter - 'A');
-            const int32_t v = checkedAt(pixels, i).value;
+            const int32_t v = checkedAt(pixels, i);
             if (v >= Pixel::kNoiseLevel + 1) {
                 checkedAt(values, g) += v;
                 int32_t& strongestIndex = checkedAt(strongest, g);
-                if (v > checkedAt(pixels, static_cast<size_t>(strongestIndex)).value) {
+                if (v > checkedAt(pixels, static_cast<size_t>(strongestIndex))) {
                     strongestIndex = static_cast<int32_t>(i);
                 }
             }

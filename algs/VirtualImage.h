@@ -17,6 +17,8 @@ public:
 
     // This frame's group sums and strongest members from the real pixels' values.
     void updateValues(std::span<const Pixel> pixels);
+    // The same from the real pixels' values alone, in index order.
+    void updateValues(std::span<const int32_t> pixelValues);
 
     std::vector<int32_t> values;               // summed strength of the members above noise
     std::vector<std::string> groups;           // the letters of each group

@@ -58,8 +58,8 @@ TEST_F(AlgsTest, ConstructionBuildsFifteenPixelsWithTheFixedGains) {
                            1.4851f, 1.5033f, 2.4154f, 1.5378f, 1.5431f, 1.04f,   1.0493f};
     ASSERT_EQ(algs.pixels.size(), 15u);
     for (size_t i = 0; i < 15; ++i) {
-        EXPECT_EQ(algs.pixels[i].gain, gains[i]) << i;
-        EXPECT_EQ(algs.pixels[i].index, static_cast<int>(i));
+        EXPECT_EQ(algs.pixels.gain[i], gains[i]) << i;
+        EXPECT_EQ(algs.pixels.index[i], static_cast<int>(i));
     }
     EXPECT_EQ(algs.lastEventPhase, 0);
     EXPECT_EQ(algs.log.subsystem(), "com.zantor.hid.TolkaTouch");
@@ -70,12 +70,12 @@ TEST_F(AlgsTest, ConstructionBuildsOneVirtualPixelPerGroupIndexedByItsFirstLette
     const Algs algs;
     ASSERT_EQ(algs.virtualPixels.size(), 23u);
     for (size_t i = 0; i < 23; ++i) {
-        EXPECT_EQ(algs.virtualPixels[i].name, algs.virtualImage.groups[i]);
-        EXPECT_EQ(algs.virtualPixels[i].gain, algs.virtualImage.normalizationFactors[i]);
-        EXPECT_EQ(algs.virtualPixels[i].index, static_cast<int>(algs.virtualImage.groups[i][0]));
+        EXPECT_EQ(virtualPixelName(i), algs.virtualImage.groups[i]);
+        EXPECT_EQ(algs.virtualPixels.gain[i], algs.virtualImage.normalizationFactors[i]);
+        EXPECT_EQ(algs.virtualPixels.index[i], static_cast<int>(algs.virtualImage.groups[i][0]));
     }
-    EXPECT_EQ(algs.virtualPixels[0].index, 65);
-    EXPECT_EQ(algs.virtualPixels[22].index, 77);
+    EXPECT_EQ(algs.virtualPixels.index[0], 65);
+    EXPECT_EQ(algs.virtualPixels.index[22], 77);
 }
 
 TEST_F(AlgsTest, CreatedEventsCarryMaskPhaseAndRegion) {
@@ -217,13 +217,14 @@ TEST_F(AlgsTest, ResetClearsThePerTouchStatisticsButNotTheHysteresisOrCounters) 
     script.playUntil(1100);
     algs.eventStats.numTaps = 7;
     algs.Reset();
-    for (const Pixel& p : algs.pixels) {
+    for (size_t i = 0; i < algs.pixels.size(); ++i) {
+        const Pixel p = algs.pixels.pixel(i);
         EXPECT_FALSE(p.wasOn);
         EXPECT_FALSE(p.wasAboveNoise);
         EXPECT_EQ(p.maxNormalizedAboveNoise, 0.0f);
     }
-    for (const VirtualPixel& p : algs.virtualPixels) EXPECT_FALSE(p.wasOn);
-    EXPECT_TRUE(algs.pixels[2].isOn);
+    for (size_t i = 0; i < algs.virtualPixels.size(); ++i) EXPECT_FALSE(algs.virtualPixels.pixel(i).wasOn);
+    EXPECT_TRUE(algs.pixels.pixel(2).isOn);
     EXPECT_EQ(algs.handStats.touchScore, 0.0f);
     EXPECT_EQ(algs.handStats.maxOnStrength, 0.0f);
     EXPECT_EQ(algs.eventStats.numTaps, 7u);
@@ -238,9 +239,9 @@ TEST_F(AlgsTest, GroupSumAboveThirtyTwoThousandSevenHundredSixtySevenWrapsToANeg
     EventList out;
     algs.processTouchFrame(readings, 1, 8, out);
     ASSERT_EQ(algs.virtualImage.values[6], 23137 + 22604);  // CDE
-    EXPECT_EQ(algs.virtualPixels[6].value,
+    EXPECT_EQ(algs.virtualPixels.value[6],
               static_cast<int32_t>(0.6667f * static_cast<float>(static_cast<int16_t>(23137 + 22604))));
-    EXPECT_LT(algs.virtualPixels[6].value, 0);
+    EXPECT_LT(algs.virtualPixels.value[6], 0);
 }
 
 // --- Whole touches ---
@@ -395,7 +396,7 @@ TEST_F(AlgsTest, ActivationThresholdDecidesWhichPixelsAreOn) {
     EXPECT_EQ(script.playUntil(1500), Events{});
     algs.setState("ActivationThreshold", PropertyValue(100.0));
     EXPECT_EQ(script.playUntil(2200), (Events{mayBegin(1, script.frameAt(2016)), tap(1, script.frameAt(2112))}));
-    EXPECT_EQ(algs.pixels[2].normalized, 0.0f);
+    EXPECT_EQ(algs.pixels.normalized[2], 0.0f);
 }
 
 TEST_F(AlgsTest, RaisedActivationThresholdEndsAFirmTouchOnTheNextFrame) {
@@ -510,7 +511,7 @@ TEST_F(AlgsTest, WritingAFactorChangesTheListButNotTheVirtualPixelsGain) {
     algs.setState("VirtualNormalizationFactors.19", PropertyValue(2.5));
     EXPECT_EQ(algs.getState("VirtualNormalizationFactors.19"), PropertyValue(2.5));
     EXPECT_EQ(algs.virtualImage.normalizationFactors[19], 2.5f);
-    EXPECT_EQ(algs.virtualPixels[19].gain, 0.4f);
+    EXPECT_EQ(algs.virtualPixels.gain[19], 0.4f);
 }
 
 TEST_F(AlgsTest, ReadingResetEventStatsYieldsNullAndWritingItClearsTheCounters) {
@@ -620,7 +621,7 @@ TEST_F(AlgsTest, PixelCOnWithReadingThreeHundredTwelveAndValueFiveHundredNinetyN
     readings[2] = 312;
     EventList out;
     algs.processTouchFrame(readings, 1, 1000, out);
-    algs.pixels[2].value = 599;
+    algs.pixels.value[2] = 599;
     const std::string line = algs.touchStateDescription(readings, 1000);
     EXPECT_NE(line.find(", C= 312  599<==ON, D=   0    0, "), std::string::npos) << line;
 }

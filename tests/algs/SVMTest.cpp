@@ -126,5 +126,57 @@ TEST(SVMTest, EachRankIsOneFusedMultiplyAdd) {
     EXPECT_EQ(svm.getSVMScore(), expected + 2.0083f);
 }
 
+// The score a full sort of the values gives, step by step as the classifier defines it.
+float scoreBySortingEverything(const SVM& svm, std::vector<int> values) {
+    std::sort(values.begin(), values.end(), std::greater<>());
+    float expected = 0.0f;
+    for (size_t i = 0; i < values.size(); ++i) {
+        expected = std::fma((static_cast<float>(values[i]) - svm.means[i]) / svm.scales[i], svm.weights[i], expected);
+    }
+    return expected + svm.bias;
+}
+
+TEST(SVMTest, RealAndVirtualRowsScoreAsTheListsOfPixelsDoWithNegativeZeroAndTiedValues) {
+    // Negative, zero, tied and large values mixed, in several arrangements.
+    const int pattern[] = {0, -96, 700, 0, 76, 75, 700, -32768, 32767, 0, 1, -1, 76, 400, 0, 0, 2147483647, -5};
+    for (size_t shift = 0; shift < 6; ++shift) {
+        SVM byLists;
+        SVM byRows;
+        Frame frame = quietFrame();
+        std::array<float, kPixelCount> gains{};
+        std::array<float, kVirtualPixelCount> virtualGains{};
+        RealPixels rows(gains, {});
+        VirtualPixels virtualRows(virtualGains, {});
+        std::vector<int> values;
+        for (size_t i = 0; i < 38; ++i) {
+            const int v = pattern[(i * 5 + shift) % std::size(pattern)];
+            values.push_back(v);
+            if (i < 15) {
+                frame.pixels[i].value = v;
+                rows.value[i] = v;
+            } else {
+                frame.virtualPixels[i - 15].value = v;
+                virtualRows.value[i - 15] = v;
+            }
+        }
+        byLists.updateSVMScore(frame.pixels, frame.virtualPixels, 200.0f);
+        byRows.updateSVMScore(rows, virtualRows, 200.0f);
+        EXPECT_EQ(byLists.getSVMScore(), scoreBySortingEverything(byLists, values)) << shift;
+        EXPECT_EQ(byRows.getSVMScore(), byLists.getSVMScore()) << shift;
+    }
+}
+
+TEST(SVMTest, FewerElementsThanRanksScoreTheirOwnRanksOnly) {
+    SVM svm;
+    Frame frame = quietFrame();
+    frame.pixels.erase(frame.pixels.begin() + 4, frame.pixels.end());
+    frame.virtualPixels.erase(frame.virtualPixels.begin() + 3, frame.virtualPixels.end());
+    const std::vector<int> values = {0, 300, -20, 300, 90, 0, 1200};
+    for (size_t i = 0; i < 4; ++i) frame.pixels[i].value = values[i];
+    for (size_t i = 0; i < 3; ++i) frame.virtualPixels[i].value = values[4 + i];
+    svm.updateSVMScore(frame.pixels, frame.virtualPixels, 200.0f);
+    EXPECT_EQ(svm.getSVMScore(), scoreBySortingEverything(svm, values));
+}
+
 }  // namespace
 }  // namespace TolkaTouch
