@@ -101,7 +101,7 @@ inline void updateElement(int raw, float divisor, float gain, int32_t& value, fl
 
 }  // namespace PixelDetail
 
-// Inline: it runs for 38 elements every frame, and the call would cost as much as the work.
+// Inline: the call would cost as much as the work.
 inline void Pixel::updatePixelState(int raw, float divisor) {
     PixelDetail::updateElement(raw, divisor, gain, value, normalized, peak, valley, isOn, aboveNoise, wasAboveNoise,
                                wasOn, maxNormalizedAboveNoise);

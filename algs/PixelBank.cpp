@@ -16,7 +16,6 @@ TOLKA_MACHINE_VARIANTS void PixelBank<N>::update(const std::array<int16_t, N>& r
     }
 }
 
-
 template class PixelBank<kPixelCount>;
 template class PixelBank<kVirtualPixelCount>;
 
