@@ -23,6 +23,7 @@ import itertools
 import json
 import os
 import sys
+import uuid
 from dataclasses import dataclass
 from typing import Iterable, List, Mapping, Optional, Sequence, Union
 
@@ -141,13 +142,17 @@ def evaluate(corpus, settings_grid: Grid = None, client=None, tolerance_ms: floa
     if own:
         client = local_client()
     try:
-        loaded = [client.submit(_load, path, key=f"load-{n}-{path}") for n, path in enumerate(documents)]
+        # Keys name this call's tasks: a client keeps a finished task under its key until every
+        # future of it is released, which happens in the background, so a key reused by the next
+        # call on the same client could hand back the last call's result.
+        run = uuid.uuid4().hex
+        loaded = [client.submit(_load, path, key=f"load-{run}-{n}") for n, path in enumerate(documents)]
         shipped = client.scatter(recordings) if recordings else []
         results = []
         for number, point in enumerate(points):
-            parts = [client.submit(_score, item, point, tolerance_us, key=f"score-{number}-{n}")
+            parts = [client.submit(_score, item, point, tolerance_us, key=f"score-{run}-{number}-{n}")
                      for n, item in enumerate(loaded)]
-            parts += [client.submit(_score_recording, item, point, tolerance_us, key=f"score-{number}-r{n}")
+            parts += [client.submit(_score_recording, item, point, tolerance_us, key=f"score-{run}-{number}-r{n}")
                       for n, item in enumerate(shipped)]
             texts = client.gather(parts)
             texts += [_core.failed_evaluation(path, reason, point, tolerance_us) for path, reason in failures]

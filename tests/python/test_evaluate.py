@@ -76,6 +76,24 @@ def test_an_unreadable_document_is_named_and_counted_as_eval_does(tool, corpus, 
     assert [failure["File"] for failure in point.result["Failures"]] == [str(broken)]
 
 
+def _stand_in():
+    return "not an evaluation"
+
+
+def test_tasks_the_client_already_holds_never_stand_in_for_the_evaluations_own(tool, corpus, client):
+    # Results of another evaluation on the same client, still held under the names one of its
+    # tasks could have, as they are until the client releases them in the background.
+    paths = [str(corpus / "taps.json"), str(corpus / "holds.json")]
+    held = [client.submit(_stand_in, key=key, pure=False)
+            for key in ["score-0-0", "score-0-1", f"load-0-{paths[0]}", f"load-1-{paths[1]}"]]
+    client.gather(held)
+    [point] = evaluation.evaluate(paths, None, client=client)
+    status, expected = cli_evaluation(tool, *paths)
+    assert status == 0
+    assert point.result == expected
+    del held
+
+
 def test_a_refused_setting_raises_before_anything_runs(client):
     with pytest.raises(tolkatouch.SettingError) as error:
         evaluation.evaluate(["/nonexistent"], {"HoldTimeoutMilliseconds": [0]}, client=client)
