@@ -28,38 +28,14 @@ bool precedes(float keyA, int32_t indexA, float keyB, int32_t indexB) {
     return indexA < indexB;
 }
 
-bool precedes(const Pixel& a, const Pixel& b) {
-    return precedes(a.maxNormalizedAboveNoise, a.index, b.maxNormalizedAboveNoise, b.index);
-}
-
-}  // namespace
-
-std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels) {
-    if (pixels.size() < 2) throw std::out_of_range("vector");
-    const Pixel* first = &pixels[0];
-    const Pixel* second = &pixels[1];
-    if (precedes(*second, *first)) std::swap(first, second);
-    for (size_t i = 2; i < pixels.size(); ++i) {
-        const Pixel* p = &pixels[i];
-        if (precedes(*p, *first)) {
-            second = first;
-            first = p;
-        } else if (precedes(*p, *second)) {
-            second = p;
-        }
-    }
-    return {first, second};
-}
-
-std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pixels) {
-    const auto before = [&](size_t a, size_t b) {
-        return precedes(pixels.maxNormalizedAboveNoise[a], pixels.index[a], pixels.maxNormalizedAboveNoise[b],
-                        pixels.index[b]);
-    };
+// The positions of the first two of `count` (at least 2) elements in the order `before`, in one
+// pass.
+template <typename Before>
+std::pair<size_t, size_t> twoFirstPositions(size_t count, Before before) {
     size_t first = 0;
     size_t second = 1;
     if (before(second, first)) std::swap(first, second);
-    for (size_t i = 2; i < pixels.size(); ++i) {
+    for (size_t i = 2; i < count; ++i) {
         if (before(i, first)) {
             second = first;
             first = i;
@@ -68,6 +44,24 @@ std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pi
         }
     }
     return {first, second};
+}
+
+}  // namespace
+
+std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels) {
+    if (pixels.size() < 2) throw std::out_of_range("vector");
+    const auto [first, second] = twoFirstPositions(pixels.size(), [&](size_t a, size_t b) {
+        return precedes(pixels[a].maxNormalizedAboveNoise, pixels[a].index, pixels[b].maxNormalizedAboveNoise,
+                        pixels[b].index);
+    });
+    return {&pixels[first], &pixels[second]};
+}
+
+std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pixels) {
+    return twoFirstPositions(pixels.size(), [&](size_t a, size_t b) {
+        return precedes(pixels.maxNormalizedAboveNoise[a], pixels.index[a], pixels.maxNormalizedAboveNoise[b],
+                        pixels.index[b]);
+    });
 }
 
 HandStats::HandStats() = default;
