@@ -76,16 +76,10 @@ VirtualImage::VirtualImage() {
 }
 
 void VirtualImage::updateValues(std::span<const Pixel> pixels) {
-    std::array<int32_t, kPixelCount> row;
-    if (pixels.size() == kPixelCount) {
-        for (size_t i = 0; i < kPixelCount; ++i) row[i] = pixels[i].value;
-        updateValues(row);
-        return;
-    }
-    // Any other number of pixels: only the values are read.
-    std::vector<int32_t> values(pixels.size());
-    for (size_t i = 0; i < pixels.size(); ++i) values[i] = pixels[i].value;
-    updateValues(values);
+    // Only the values are read.
+    std::vector<int32_t> pixelValues(pixels.size());
+    for (size_t i = 0; i < pixels.size(); ++i) pixelValues[i] = pixels[i].value;
+    updateValues(pixelValues);
 }
 
 void VirtualImage::updateValues(std::span<const int32_t> pixels) {
