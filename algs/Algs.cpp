@@ -73,9 +73,7 @@ void Algs::processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint
     const float threshold = handStats.ActivationThreshold;
 
     // 1. The real pixels, in index order.
-    std::array<int16_t, kPixelCount> raw;
-    std::copy(readings, readings + kPixelCount, raw.begin());
-    pixels.update(raw, threshold);
+    pixels.update(std::span<const int16_t, kPixelCount>(readings, kPixelCount), threshold);
 
     // 2. The group sums.
     virtualImage.updateValues(std::span(pixels.value).first<kPixelCount>());

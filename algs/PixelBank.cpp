@@ -6,7 +6,7 @@ namespace TolkaTouch {
 
 // In two machine variants: the wide one does eight lanes per instruction.
 template <size_t N>
-TOLKA_MACHINE_VARIANTS void PixelBank<N>::update(const std::array<int16_t, N>& raw, float divisor) {
+TOLKA_MACHINE_VARIANTS void PixelBank<N>::update(std::span<const int16_t, N> raw, float divisor) {
     // The padding lanes read 0, so that the loop runs over whole vectors.
     Row<int16_t> padded{};
     std::copy(raw.begin(), raw.end(), padded.begin());

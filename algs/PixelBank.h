@@ -39,7 +39,7 @@ public:
     static constexpr size_t size() { return N; }
 
     // One frame for every element: raw[i] as Pixel::updatePixelState(raw[i], divisor) on element i.
-    void update(const std::array<int16_t, N>& raw, float divisor);
+    void update(std::span<const int16_t, N> raw, float divisor);
     // Pixel::resetGlobalStats on every element.
     void resetGlobalStats();
 
