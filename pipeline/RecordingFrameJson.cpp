@@ -9,7 +9,7 @@
 #include <nlohmann/json.hpp>
 
 #include "common/Util.h"
-#include "pipeline/ReportHex.h"
+#include "platform/Hex.h"
 #include "platform/PropertyValueJson.h"
 
 namespace TolkaTouch::RecordingFrameJson {
@@ -87,7 +87,7 @@ bool unsignedMember(value& member, uint64_t& number) { return !member.get_uint64
 
 // Any hex text the general reader takes; throws std::invalid_argument as it does.
 void decodeReportHex(std::string_view text, std::vector<uint8_t>& bytes) {
-    if (!ReportHex::decodeWriterForm(text, bytes)) bytes = Util::bytesFromHexString(std::string(text));
+    if (!Hex::bytesFromRecordingForm(text, bytes)) bytes = Util::bytesFromHexString(std::string(text));
 }
 
 }  // namespace

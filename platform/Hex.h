@@ -21,4 +21,10 @@ std::string text(std::span<const uint8_t> bytes, Spacing spacing);
 // Throws std::invalid_argument "not hex" or "odd number of hex digits".
 std::vector<uint8_t> bytesFromPairs(std::string_view text, std::string_view ignored = " ");
 
+// The recording form as documents carry a report ("hh " a byte, digits of either case, the last
+// space optional), read at the speed of reading the document around it, sixteen bytes at a time
+// where the processor has a byte shuffle: into `bytes`, whose storage is reused; false, with
+// `bytes` unspecified, for any other text.
+bool bytesFromRecordingForm(std::string_view text, std::vector<uint8_t>& bytes);
+
 }  // namespace TolkaTouch::Hex

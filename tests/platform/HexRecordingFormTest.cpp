@@ -1,4 +1,4 @@
-#include "pipeline/ReportHex.h"
+#include "platform/Hex.h"
 
 #include <gtest/gtest.h>
 
@@ -15,7 +15,7 @@ using Bytes = std::vector<uint8_t>;
 
 std::optional<Bytes> decoded(const std::string& text) {
     Bytes bytes{0xEE};  // storage reused, whatever it held
-    if (!ReportHex::decodeWriterForm(text, bytes)) return std::nullopt;
+    if (!Hex::bytesFromRecordingForm(text, bytes)) return std::nullopt;
     return bytes;
 }
 
@@ -49,7 +49,7 @@ std::string writerForm(const Bytes& bytes, bool upper) {
     return text;
 }
 
-TEST(ReportHexTest, EveryByteValueDecodesInEitherCaseWithOrWithoutTheLastSpace) {
+TEST(HexRecordingFormTest, EveryByteValueDecodesInEitherCaseWithOrWithoutTheLastSpace) {
     Bytes every(256);
     for (int i = 0; i < 256; ++i) every[i] = static_cast<uint8_t>(i);
     for (const bool upper : {false, true}) {
@@ -60,9 +60,9 @@ TEST(ReportHexTest, EveryByteValueDecodesInEitherCaseWithOrWithoutTheLastSpace) 
     }
 }
 
-TEST(ReportHexTest, EmptyTextIsNoBytes) { EXPECT_EQ(decoded(""), Bytes{}); }
+TEST(HexRecordingFormTest, EmptyTextIsNoBytes) { EXPECT_EQ(decoded(""), Bytes{}); }
 
-TEST(ReportHexTest, TextOfAnotherFormIsRefused) {
+TEST(HexRecordingFormTest, TextOfAnotherFormIsRefused) {
     EXPECT_EQ(decoded("0"), std::nullopt);
     EXPECT_EQ(decoded("01 0"), std::nullopt);
     EXPECT_EQ(decoded("01,0a"), std::nullopt);
@@ -72,7 +72,7 @@ TEST(ReportHexTest, TextOfAnotherFormIsRefused) {
 
 // A report's 73 bytes span four blocks of sixteen and a remainder: a wrong character anywhere,
 // of any value, is refused, and nothing else is.
-TEST(ReportHexTest, OneWrongCharacterAnywhereInALongReportIsRefused) {
+TEST(HexRecordingFormTest, OneWrongCharacterAnywhereInALongReportIsRefused) {
     Bytes report(73);
     for (size_t i = 0; i < report.size(); ++i) report[i] = static_cast<uint8_t>(i * 37 + 11);
     const std::string text = writerForm(report, false);
@@ -85,7 +85,7 @@ TEST(ReportHexTest, OneWrongCharacterAnywhereInALongReportIsRefused) {
     }
 }
 
-TEST(ReportHexTest, RandomTextsOfHexLikeCharactersDecodeByTheRules) {
+TEST(HexRecordingFormTest, RandomTextsOfHexLikeCharactersDecodeByTheRules) {
     const std::string alphabet = "0123456789abcdefABCDEF /:@`gG\x7f\x80\xb0\xff";
     std::mt19937 random(20261124);
     size_t accepted = 0;

@@ -1,4 +1,4 @@
-#include "pipeline/ReportHex.h"
+#include "platform/Hex.h"
 
 #include <array>
 #include <cstddef>
@@ -7,7 +7,7 @@
 #include <immintrin.h>
 #endif
 
-namespace TolkaTouch::ReportHex {
+namespace TolkaTouch::Hex {
 
 namespace {
 
@@ -118,7 +118,7 @@ bool canDecodeBlocks() {
 
 }  // namespace
 
-bool decodeWriterForm(std::string_view text, std::vector<uint8_t>& bytes) {
+bool bytesFromRecordingForm(std::string_view text, std::vector<uint8_t>& bytes) {
     const auto* at = reinterpret_cast<const uint8_t*>(text.data());
     const size_t triples = text.size() / 3;
     const size_t tail = text.size() % 3;  // 2: a last pair without its separator
@@ -142,4 +142,4 @@ bool decodeWriterForm(std::string_view text, std::vector<uint8_t>& bytes) {
     return true;
 }
 
-}  // namespace TolkaTouch::ReportHex
+}  // namespace TolkaTouch::Hex
