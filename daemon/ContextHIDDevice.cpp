@@ -9,18 +9,17 @@ namespace TolkaTouch {
 ContextHIDDevice::ContextHIDDevice(HIDDeviceRef inner, std::string node, uint32_t service,
                                    std::shared_ptr<WatchHub> watch, std::function<void()> afterFrame)
     : WrappingHIDDevice(std::move(inner)),
-      _node(std::move(node)),
       _service(service),
       _watch(std::move(watch)),
-      _afterFrame(std::move(afterFrame)) {}
+      _afterFrame(std::move(afterFrame)),
+      _context{std::move(node), service, std::nullopt} {}
 
 void ContextHIDDevice::beforeInputReport(const uint8_t* report, size_t length) {
     if (_watch && _watch->active()) _watch->report(_service, report, length);
-    LogContext logContext{_node, _service, std::nullopt};
     const auto image = InputReport::Image::parse(report, length);
-    if (image) logContext.frame = image->frameNumber;
+    _context.frame = image ? std::optional<uint64_t>(image->frameNumber) : std::nullopt;
     _handlingImage = image.has_value();
-    SystemLog::setThreadContext(std::move(logContext));
+    SystemLog::setThreadContext(_context);
 }
 
 void ContextHIDDevice::afterInputReport() {

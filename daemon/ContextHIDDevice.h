@@ -10,6 +10,7 @@
 #include <string>
 
 #include "daemon/WrappingHIDDevice.h"
+#include "platform/Log.h"
 
 namespace TolkaTouch {
 
@@ -26,11 +27,12 @@ protected:
     void afterInputReport() override;
 
 private:
-    std::string _node;
     uint32_t _service;
     std::shared_ptr<WatchHub> _watch;
     std::function<void()> _afterFrame;
-    bool _handlingImage = false;  // the report thread's own
+    // The report thread's own: the context given to the log, only its frame changing per report.
+    LogContext _context;
+    bool _handlingImage = false;
 };
 
 }  // namespace TolkaTouch

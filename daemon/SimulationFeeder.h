@@ -49,9 +49,11 @@ public:
     };
 
     // How far ahead of its time a report is written, and how much the feeder writes each time it
-    // wakes: reports due in the next kLead - kBatch to kLead wait on the device.
-    static constexpr std::chrono::nanoseconds kLead = std::chrono::milliseconds(400);
-    static constexpr std::chrono::nanoseconds kBatch = std::chrono::milliseconds(200);
+    // wakes: reports due in the next kLead - kBatch to kLead wait on the device. A second's worth
+    // a wake-up: on a machine where waking a thread costs as much as handling a report, the
+    // feeder's wake-ups are a cost of their own (150 reports of 73 bytes wait at most).
+    static constexpr std::chrono::nanoseconds kLead = std::chrono::milliseconds(1200);
+    static constexpr std::chrono::nanoseconds kBatch = std::chrono::milliseconds(1000);
 
     // Opens the document at `path` and reads its first frame. Throws std::runtime_error with a
     // one-line message when it cannot be read or is not a recording document.

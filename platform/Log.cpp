@@ -175,7 +175,13 @@ struct SinkState {
     LogRateGuard guard;
     std::vector<LogRateRule> rules;
     std::unordered_map<const void*, LogRate> resolved;  // each format's rate, found once
-    std::unordered_map<const void*, LogRecord> lastFolded;
+    // The last folded line of each format; kept (not erased) once summarised, so that its strings
+    // are reused by the next line folded.
+    struct Folded {
+        LogRecord record;
+        bool pending = false;
+    };
+    std::unordered_map<const void*, Folded> lastFolded;
     SystemLog::Destination destination = SystemLog::Destination::Automatic;
     std::shared_ptr<LogSink> journal = std::make_shared<JournalSink>();
     std::shared_ptr<LogSink> standardError = std::make_shared<StandardErrorSink>();
@@ -216,36 +222,50 @@ struct SinkState {
         return best ? best->rate : LogRate{};
     }
 
-    LogRate resolvedRate(const LogRecord& record) {
-        auto it = resolved.find(record.format);
-        if (it == resolved.end()) it = resolved.emplace(record.format, rateFor(record.category, record.format)).first;
+    LogRate resolvedRate(const std::string& category, const char* format) {
+        auto it = resolved.find(format);
+        if (it == resolved.end()) it = resolved.emplace(format, rateFor(category, format)).first;
         return it->second;
     }
 
-    // Writes `record` through the rate guard (when it stands before the sink).
-    void deliver(LogRecord record) {
+    // Writes the line made by `makeRecord` through the rate guard (when it stands before the sink).
+    // A line the guard folds is not made into a record of its own: its text and fields are copied
+    // into the kept line of its format, whose strings already have room.
+    template <typename MakeRecord, typename KeepFolded>
+    void deliver(const char* format, const std::string& category, LogLevel level, const MakeRecord& makeRecord,
+                 const KeepFolded& keepFolded) {
         if (observed.load(std::memory_order_relaxed)) {
             std::shared_ptr<LogSink> watcher;
             {
                 std::lock_guard lock(mutex);
                 watcher = observer;
             }
-            if (watcher) watcher->write(record);
+            if (watcher) watcher->write(makeRecord());
         }
         auto [sink, guarded] = current();
-        if (guarded && record.format) {
+        if (!guarded || !format) {
+            sink->write(makeRecord());
+            return;
+        }
+        LogRecord record;
+        {
             std::lock_guard lock(guardMutex);
             const LogRateGuard::Decision decision =
-                guard.admit(record.format, resolvedRate(record), monotonicNow(),
-                            static_cast<int>(record.level));
+                guard.admit(format, resolvedRate(category, format), monotonicNow(), static_cast<int>(level));
             switch (decision.verdict) {
-            case LogRateGuard::Verdict::Write: break;
-            case LogRateGuard::Verdict::Fold: lastFolded[record.format] = std::move(record); return;
+            case LogRateGuard::Verdict::Write: record = makeRecord(); break;
+            case LogRateGuard::Verdict::Fold: {
+                Folded& kept = lastFolded[format];
+                keepFolded(kept.record);
+                kept.pending = true;
+                return;
+            }
             case LogRateGuard::Verdict::Summary:
+                record = makeRecord();
                 record.message = foldedSummary(record.message, decision.folded, decision.seconds);
                 record.level = static_cast<LogLevel>(decision.level);
                 record.folded = decision.folded;
-                lastFolded.erase(record.format);
+                if (auto it = lastFolded.find(format); it != lastFolded.end()) it->second.pending = false;
                 break;
             }
         }
@@ -258,9 +278,9 @@ struct SinkState {
             std::lock_guard lock(guardMutex);
             for (const LogRateGuard::Pending& pending : guard.flush(monotonicNow(), everything)) {
                 auto it = lastFolded.find(pending.format);
-                if (it == lastFolded.end()) continue;
-                LogRecord record = std::move(it->second);
-                lastFolded.erase(it);
+                if (it == lastFolded.end() || !it->second.pending) continue;
+                LogRecord record = it->second.record;
+                it->second.pending = false;
                 record.message = foldedSummary(record.message, pending.folded, pending.seconds);
                 record.level = static_cast<LogLevel>(pending.level);
                 record.folded = pending.folded;
@@ -294,25 +314,50 @@ Log::Log(std::string subsystem, std::string category)
 void Log::write(LogLevel level, std::string message, const char* file, unsigned line, const char* function) const {
     if (!enabled(level)) return;
     // The call site's file name stands for its format: one string per place in the source.
-    emit(level, LogFormat(file, file, line, function), std::move(message));
+    emit(level, LogFormat(file, file, line, function), message);
 }
 
-std::string Log::formatUnchecked(const char* format, ...) {
+void Log::emitFormatted(LogLevel level, const LogFormat* format, ...) const {
     va_list args;
     va_start(args, format);
-    std::string message = formatStringV(format, args);
+    va_list copy;
+    va_copy(copy, args);
+    // Most lines fit on the stack; a longer one is formatted again into a string of its length.
+    char small[256];
+    const int needed = std::vsnprintf(small, sizeof small, format->text, copy);
+    va_end(copy);
+    if (needed >= 0 && static_cast<size_t>(needed) < sizeof small) {
+        emit(level, *format, std::string_view(small, static_cast<size_t>(needed)));
+    } else {
+        emit(level, *format, formatStringV(format->text, args));
+    }
     va_end(args);
-    return message;
 }
 
-void Log::emit(LogLevel level, const LogFormat& format, std::string message) const {
-    LogRecord record{_subsystem, _category, level, std::move(message)};
-    record.format = format.text;
-    record.file = sourceRelative(format.file);
-    record.line = format.line;
-    record.function = format.function;
-    record.context = threadContext;
-    SinkState::shared().deliver(std::move(record));
+void Log::emit(LogLevel level, const LogFormat& format, std::string_view message) const {
+    const char* file = sourceRelative(format.file);
+    auto makeRecord = [&] {
+        LogRecord record{_subsystem, _category, level, std::string(message)};
+        record.format = format.text;
+        record.file = file;
+        record.line = format.line;
+        record.function = format.function;
+        record.context = threadContext;
+        return record;
+    };
+    auto keepFolded = [&](LogRecord& kept) {
+        kept.subsystem = _subsystem;
+        kept.category = _category;
+        kept.level = level;
+        kept.message.assign(message);
+        kept.format = format.text;
+        kept.file = file;
+        kept.line = format.line;
+        kept.function = format.function;
+        kept.context = threadContext;
+        kept.folded = 0;
+    };
+    SinkState::shared().deliver(format.text, _category, level, makeRecord, keepFolded);
 }
 
 namespace SystemLog {
@@ -457,8 +502,13 @@ void setObserver(std::shared_ptr<LogSink> observer) {
     state.observer = std::move(observer);
 }
 
-void setThreadContext(LogContext context) { threadContext = std::move(context); }
-void clearThreadContext() { threadContext = LogContext{}; }
+void setThreadContext(const LogContext& context) { threadContext = context; }
+void clearThreadContext() {
+    // Cleared in place: the device name's storage is kept for the next report.
+    threadContext.device.clear();
+    threadContext.service.reset();
+    threadContext.frame.reset();
+}
 
 std::string messageId(const LogRecord& record) {
     // A stable 128-bit identifier of the message format: two 64-bit FNV-1a hashes of the

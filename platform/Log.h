@@ -5,7 +5,9 @@
 // level is on is one atomic load, so callers test it before building costly text. Lines go to the
 // journal when running as a service, to standard error otherwise, or to a sink a test installs.
 // On the way to the journal or standard error of a service a rate guard per message format
-// (LogRateGuard) folds a format that repeats quickly into one summary line a second.
+// (LogRateGuard) folds a format that repeats quickly into one summary line a second. A line that
+// is folded is formatted on the stack and kept, as the text its summary will end with, in storage
+// its format reuses: a line written every frame allocates nothing while it folds.
 
 #include <atomic>
 #include <cstdint>
@@ -14,6 +16,7 @@
 #include <mutex>
 #include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "platform/LogRateGuard.h"
@@ -92,31 +95,32 @@ public:
     // Nothing is formatted for a level that is off.
     template <typename... Args>
     void debug(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Debug)) emit(LogLevel::Debug, format, formatUnchecked(format.text, args...));
+        if (enabled(LogLevel::Debug)) emitFormatted(LogLevel::Debug, &format, args...);
     }
     template <typename... Args>
     void info(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Info)) emit(LogLevel::Info, format, formatUnchecked(format.text, args...));
+        if (enabled(LogLevel::Info)) emitFormatted(LogLevel::Info, &format, args...);
     }
     template <typename... Args>
     void log(LogFormat format, Args... args) const {  // default level
-        if (enabled(LogLevel::Default)) emit(LogLevel::Default, format, formatUnchecked(format.text, args...));
+        if (enabled(LogLevel::Default)) emitFormatted(LogLevel::Default, &format, args...);
     }
     template <typename... Args>
     void error(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Error)) emit(LogLevel::Error, format, formatUnchecked(format.text, args...));
+        if (enabled(LogLevel::Error)) emitFormatted(LogLevel::Error, &format, args...);
     }
     template <typename... Args>
     void fault(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Fault)) emit(LogLevel::Fault, format, formatUnchecked(format.text, args...));
+        if (enabled(LogLevel::Fault)) emitFormatted(LogLevel::Fault, &format, args...);
     }
     // A line already formatted; its format, for the rate guard, is its call site.
     void write(LogLevel level, std::string message, const char* file = __builtin_FILE(),
                unsigned line = __builtin_LINE(), const char* function = __builtin_FUNCTION()) const;
 
 private:
-    static std::string formatUnchecked(const char* format, ...);
-    void emit(LogLevel level, const LogFormat& format, std::string message) const;
+    // Formats the arguments after `format` (printf-style, promoted as for any variadic call).
+    void emitFormatted(LogLevel level, const LogFormat* format, ...) const;
+    void emit(LogLevel level, const LogFormat& format, std::string_view message) const;
 
     std::string _subsystem;
     std::string _category;
@@ -170,8 +174,9 @@ std::string messageId(const LogRecord& record);
 // One "rate" line of the configuration after the word "rate", or nothing when it does not read.
 std::optional<LogRateRule> parseRateLine(const std::string& text);
 
-// The calling thread's context, given to each line it writes until changed.
-void setThreadContext(LogContext context);
+// The calling thread's context, given to each line it writes until changed. Copied into storage
+// the thread keeps, so that setting it once a report allocates nothing after the first time.
+void setThreadContext(const LogContext& context);
 void clearThreadContext();
 
 // Whether the rate guard stands before the journal and standard error: off until a service turns

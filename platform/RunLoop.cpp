@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <chrono>
 #include <cmath>
+#include <optional>
 
 namespace TolkaTouch {
 
@@ -147,15 +148,19 @@ RunLoop::RunResult RunLoop::runInMode(const std::string& modeName, double timeou
         endless ? Clock::time_point::max()
                 : Clock::now() + std::chrono::duration_cast<Clock::duration>(std::chrono::duration<double>(timeoutSeconds));
 
-    int epollFd = -1;
+    // Modes are never erased, so the mode found once stays valid for the whole run.
+    Mode* mode = nullptr;
     {
         std::lock_guard lock(_mutex);
-        epollFd = modeLocked(modeName).epollFd;
+        mode = &modeLocked(modeName);
     }
+    const int epollFd = mode->epollFd;
 
     bool handled = false;
     for (;;) {
-        std::deque<Block> blocks;
+        // Made only when blocks wait: an empty deque already allocates, and a report thread passes
+        // here twice for every report.
+        std::optional<std::deque<Block>> blocks;
         {
             std::lock_guard lock(_mutex);
             if (_stopRequested) {
@@ -165,15 +170,15 @@ RunLoop::RunResult RunLoop::runInMode(const std::string& modeName, double timeou
             if (handled && returnAfterSourceHandled) {
                 return RunResult::HandledSource;
             }
-            Mode& mode = _modes.find(modeName)->second;
-            blocks.swap(mode.blocks);
-            if (blocks.empty() && mode.sourceCount == 0) {
+            if (!mode->blocks.empty()) {
+                blocks.emplace().swap(mode->blocks);
+            } else if (mode->sourceCount == 0) {
                 return RunResult::Finished;
             }
         }
-        if (!blocks.empty()) {
+        if (blocks) {
             // Every block queued before this pass runs in it; later ones wait for the next pass.
-            for (Block& block : blocks) {
+            for (Block& block : *blocks) {
                 block();
                 block = nullptr;
             }

@@ -39,20 +39,41 @@ SimulatedHIDDevice::~SimulatedHIDDevice() {
     ::close(_inputFd);
 }
 
-bool SimulatedHIDDevice::writeInputReport(const uint8_t* bytes, size_t length, uint64_t due) {
-    return writeInputReport(std::vector<uint8_t>(bytes, bytes + (bytes ? length : 0)), due);
+bool SimulatedHIDDevice::writeInputReport(std::vector<uint8_t> bytes, uint64_t due) {
+    return writeInputReport(bytes.data(), bytes.size(), due);
 }
 
-bool SimulatedHIDDevice::writeInputReport(std::vector<uint8_t> bytes, uint64_t due) {
+void SimulatedHIDDevice::pushLocked(const uint8_t* bytes, size_t length, uint64_t due) {
+    if (_count == _ring.size()) {
+        // Full: a ring twice the size, the waiting reports first and in order.
+        std::vector<Waiting> larger(std::max<size_t>(16, 2 * _ring.size()));
+        for (size_t index = 0; index < _count; ++index) {
+            larger[index] = std::move(_ring[(_head + index) % _ring.size()]);
+        }
+        _ring.swap(larger);
+        _head = 0;
+    }
+    Waiting& slot = _ring[(_head + _count) % _ring.size()];
+    slot.bytes.assign(bytes, bytes + (bytes ? length : 0));
+    slot.due = due;
+    ++_count;
+}
+
+void SimulatedHIDDevice::popLocked() {
+    _head = (_head + 1) % _ring.size();
+    --_count;
+}
+
+bool SimulatedHIDDevice::writeInputReport(const uint8_t* bytes, size_t length, uint64_t due) {
     {
         std::lock_guard lock(_mutex);
         if (_ended) {
             return false;
         }
-        _reports.push_back(Waiting{std::move(bytes), due});
+        pushLocked(bytes, length, due);
         if (_delivery == Delivery::AtDueTime) {
             // The timer is set for the first waiting report only; a later one's turn comes after it.
-            if (_reports.size() == 1) setTimerLocked(due);
+            if (_count == 1) setTimerLocked(due);
             return true;
         }
     }
@@ -71,7 +92,7 @@ void SimulatedHIDDevice::simulateRemoval() {
     _ended = true;
     if (_delivery == Delivery::AtDueTime) {
         // The end is read once the last report is: at once when none waits.
-        if (_reports.empty()) setTimerLocked(0);
+        if (_count == 0) setTimerLocked(0);
         return;
     }
     // One more count than reports: the read that finds the queue empty reports the end.
@@ -86,36 +107,45 @@ void SimulatedHIDDevice::setTimerLocked(uint64_t due) {
     ::timerfd_settime(_inputFd, TFD_TIMER_ABSTIME, &timer, nullptr);
 }
 
-// One report whose time has come, then the timer set for the next one; under the lock, so the
-// timer always stands for the first waiting report when the lock is let go.
-HIDDeviceBase::ReadOutcome SimulatedHIDDevice::readDueReport(uint8_t* buffer, size_t capacity) {
-    std::lock_guard lock(_mutex);
+// Forgets a firing that stands for no report; the next write sets the timer again.
+void SimulatedHIDDevice::forgetFiringLocked() {
     uint64_t firings = 0;
     [[maybe_unused]] const ssize_t got = ::read(_inputFd, &firings, sizeof firings);
-    if (_reports.empty()) {
+}
+
+// One report whose time has come, then the timer set for the next one; under the lock, so the
+// timer always stands for the first waiting report when the lock is let go. Setting the timer
+// also forgets its firing, so a report costs the reading thread one call besides its wait; the
+// firing is read only when nothing follows.
+HIDDeviceBase::ReadOutcome SimulatedHIDDevice::readDueReport(uint8_t* buffer, size_t capacity) {
+    std::lock_guard lock(_mutex);
+    if (_count == 0) {
+        if (!_ended) forgetFiringLocked();
         return {_ended ? ReadStatus::Gone : ReadStatus::NothingToRead};
     }
-    if (_reports.front().due > monotonicNanoseconds()) {
-        setTimerLocked(_reports.front().due);
+    if (frontLocked().due > monotonicNanoseconds()) {
+        setTimerLocked(frontLocked().due);
         return {ReadStatus::NothingToRead};
     }
-    const std::vector<uint8_t> report = std::move(_reports.front().bytes);
-    _reports.pop_front();
-    if (!_reports.empty()) {
-        setTimerLocked(_reports.front().due);
-    } else if (_ended) {
-        setTimerLocked(0);
-    }
+    const std::vector<uint8_t>& report = frontLocked().bytes;
     const size_t length = std::min(report.size(), capacity);
     if (length > 0) {
         std::memcpy(buffer, report.data(), length);
+    }
+    popLocked();
+    if (_count > 0) {
+        setTimerLocked(frontLocked().due);
+    } else if (_ended) {
+        setTimerLocked(0);
+    } else {
+        forgetFiringLocked();
     }
     return {ReadStatus::Report, length};
 }
 
 size_t SimulatedHIDDevice::pendingInputReportCount() const {
     std::lock_guard lock(_mutex);
-    return _reports.size();
+    return _count;
 }
 
 HIDDeviceBase::ReadOutcome SimulatedHIDDevice::readInputReport(uint8_t* buffer, size_t capacity) {
@@ -127,16 +157,16 @@ HIDDeviceBase::ReadOutcome SimulatedHIDDevice::readInputReport(uint8_t* buffer, 
     if (::read(_inputFd, &count, sizeof count) != static_cast<ssize_t>(sizeof count)) {
         return {ReadStatus::NothingToRead};
     }
-    if (_reports.empty()) {
+    if (_count == 0) {
         return {_ended ? ReadStatus::Gone : ReadStatus::NothingToRead};
     }
-    const std::vector<uint8_t> report = std::move(_reports.front().bytes);
-    _reports.pop_front();
     // Like a datagram read: what does not fit in the buffer is lost.
+    const std::vector<uint8_t>& report = frontLocked().bytes;
     const size_t length = std::min(report.size(), capacity);
     if (length > 0) {
         std::memcpy(buffer, report.data(), length);
     }
+    popLocked();
     return {ReadStatus::Report, length};
 }
 

@@ -4,12 +4,12 @@
 // and device properties are set up by the caller; calls into the handle are counted for tests.
 //
 // Written reports wait in an unbounded queue, so that each write is exactly one report (zero-length
-// ones included) and a writer never blocks. Delivered at once, they are signalled through a
+// ones included) and a writer never blocks. The queue is a ring of slots whose storage is reused,
+// so that a stream of reports allocates nothing once the ring has grown to the most that wait. Delivered at once, they are signalled through a
 // semaphore-mode eventfd; delivered at their due times, through a timer set for the first waiting
 // report, so that a writer may queue reports ahead of their time and each report costs the reading
 // thread one wake-up and the writer none, as a real surface's report costs one read.
 
-#include <deque>
 #include <map>
 #include <vector>
 
@@ -80,20 +80,26 @@ protected:
 
 private:
     struct Waiting {
-        std::vector<uint8_t> bytes;
+        std::vector<uint8_t> bytes;  // its capacity is kept for the next report in the slot
         uint64_t due = 0;
     };
 
     SimulatedHIDDevice(int inputFd, Delivery delivery, PropertyValue::Dictionary properties);
     ReadOutcome readDueReport(uint8_t* buffer, size_t capacity);
+    Waiting& frontLocked() { return _ring[_head]; }
+    void pushLocked(const uint8_t* bytes, size_t length, uint64_t due);
+    void popLocked();
     void setTimerLocked(uint64_t due);
+    void forgetFiringLocked();
 
     const int _inputFd;  // an eventfd, or a timer for reports delivered at their due times
     const Delivery _delivery;
     std::atomic<bool> _numbered{true};
 
     mutable std::mutex _mutex;
-    std::deque<Waiting> _reports;
+    std::vector<Waiting> _ring;  // the waiting reports: _count slots from _head on, wrapping
+    size_t _head = 0;
+    size_t _count = 0;
     bool _ended = false;
     std::map<uint32_t, std::vector<uint8_t>> _featureReports;
     std::map<uint32_t, uint32_t> _failures;

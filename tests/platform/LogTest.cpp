@@ -163,6 +163,17 @@ TEST_F(LogTest, LongMessagesAreKeptWhole) {
     EXPECT_EQ(sink->messages()[0], text + "!");
 }
 
+TEST_F(LogTest, MessagesOneEitherSideOfWhatFitsOnTheStackAreKeptWhole) {
+    const Log log(kSubsystem, "Algs");
+    for (size_t length : {254u, 255u, 256u, 257u}) log.log("%s", std::string(length, 'w').c_str());
+    const std::vector<std::string> messages = sink->messages();
+    ASSERT_EQ(messages.size(), 4u);
+    EXPECT_EQ(messages[0], std::string(254, 'w'));
+    EXPECT_EQ(messages[1], std::string(255, 'w'));
+    EXPECT_EQ(messages[2], std::string(256, 'w'));
+    EXPECT_EQ(messages[3], std::string(257, 'w'));
+}
+
 TEST_F(LogTest, ClearingTheMemorySinkForgetsItsRecords) {
     const Log log(kSubsystem, "Algs");
     log.log("one");
@@ -193,6 +204,28 @@ TEST_F(LogTest, ARateGuardedSinkGetsTheBurstThenOneSummaryOfTheRestAtFlush) {
     ASSERT_EQ(records.size(), 11u);
     EXPECT_EQ(records.back().message.substr(0, 46), "Received image frame: 15 (5 lines like this in");
     EXPECT_EQ(records.back().folded, 5u);
+}
+
+TEST_F(LogTest, EachSummaryEndsWithTheTextAndContextOfTheLastLineFoldedSinceTheOneBefore) {
+    SystemLog::setSink(sink, true);
+    const Log log(kSubsystem, "GuardedTwice");
+    SystemLog::setThreadContext(LogContext{"simulated:/a/longer/document/name.json", 1u, 0u});
+    for (unsigned frame = 1; frame <= 15; ++frame) log.log("Received image frame: %u", frame);
+    SystemLog::flushFolded(true);
+    SystemLog::setThreadContext(LogContext{"/dev/hidraw0", 2u, 18u});
+    for (unsigned frame = 16; frame <= 18; ++frame) log.log("Received image frame: %u", frame);
+    SystemLog::flushFolded(true);
+    SystemLog::flushFolded(true);  // nothing folded since: no third summary
+    SystemLog::clearThreadContext();
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 12u);
+    EXPECT_EQ(records[10].message.substr(0, 46), "Received image frame: 15 (5 lines like this in");
+    EXPECT_EQ(records[10].context.device, "simulated:/a/longer/document/name.json");
+    EXPECT_EQ(records[11].message.substr(0, 46), "Received image frame: 18 (3 lines like this in");
+    EXPECT_EQ(records[11].context.device, "/dev/hidraw0");
+    EXPECT_EQ(records[11].context.service, 2u);
+    EXPECT_EQ(records[11].context.frame, 18u);
+    EXPECT_EQ(records[11].folded, 3u);
 }
 
 TEST_F(LogTest, FoldedErrorsAreSummarisedAtErrorLevel) {

@@ -256,6 +256,22 @@ TEST(SimulatedHIDDeviceTest, ReportsPastTheirDueTimeArriveInTheOrderWritten) {
     EXPECT_EQ(fixture.receiver.reports[2].bytes, (Bytes{0x01, 1, 2}));
 }
 
+TEST(SimulatedHIDDeviceTest, ReportsWrittenWhileEarlierOnesAreReadKeepOrderAndBytesAsTheQueueGrows) {
+    // Slots are reused: a report of one length follows one of another in the same slot, and the
+    // queue grows while it has wrapped round.
+    OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
+    auto report = [](int index) { return Bytes(static_cast<size_t>(1 + (index * 7) % 23), static_cast<uint8_t>(index)); };
+    int written = 0;
+    for (; written < 12; ++written) ASSERT_TRUE(fixture.device->writeInputReport(report(written), 0));
+    for (int index = 0; index < 7; ++index) EXPECT_EQ(fixture.runOnce(), RunResult::HandledSource);
+    for (; written < 60; ++written) ASSERT_TRUE(fixture.device->writeInputReport(report(written), 0));
+    EXPECT_EQ(fixture.device->pendingInputReportCount(), 53u);
+    for (int index = 7; index < 60; ++index) EXPECT_EQ(fixture.runOnce(), RunResult::HandledSource);
+    EXPECT_EQ(fixture.loop->runInMode(kMode, 0.0, true), RunResult::TimedOut);
+    ASSERT_EQ(fixture.receiver.reports.size(), 60u);
+    for (int index = 0; index < 60; ++index) EXPECT_EQ(fixture.receiver.reports[index].bytes, report(index)) << index;
+}
+
 TEST(SimulatedHIDDeviceTest, ReportDueInAnHourWaitsAndHoldsBackTheReportsAfterIt) {
     OpenDevice fixture(SimulatedHIDDevice::Delivery::AtDueTime);
     ASSERT_TRUE(fixture.device->writeInputReport(Bytes{0x01}, monotonicNow() + 3'600'000'000'000));
