@@ -14,6 +14,7 @@
 #include <cstring>
 #include <deque>
 #include <map>
+#include <optional>
 #include <sstream>
 #include <stdexcept>
 #include <unordered_map>
@@ -180,6 +181,8 @@ struct SinkState {
     struct Folded {
         LogRecord record;
         bool pending = false;
+        // The line's numbers when its text was not made (record.message is then stale).
+        std::optional<LogArguments> arguments;
     };
     std::unordered_map<const void*, Folded> lastFolded;
     SystemLog::Destination destination = SystemLog::Destination::Automatic;
@@ -229,8 +232,9 @@ struct SinkState {
     }
 
     // Writes the line made by `makeRecord` through the rate guard (when it stands before the sink).
-    // A line the guard folds is not made into a record of its own: its text and fields are copied
-    // into the kept line of its format, whose strings already have room.
+    // A line the guard folds is not made into a record of its own: its text (or its numbers, not
+    // yet formatted) and fields are copied into the kept line of its format, whose strings already
+    // have room.
     template <typename MakeRecord, typename KeepFolded>
     void deliver(const char* format, const std::string& category, LogLevel level, const MakeRecord& makeRecord,
                  const KeepFolded& keepFolded) {
@@ -256,7 +260,7 @@ struct SinkState {
             case LogRateGuard::Verdict::Write: record = makeRecord(); break;
             case LogRateGuard::Verdict::Fold: {
                 Folded& kept = lastFolded[format];
-                keepFolded(kept.record);
+                keepFolded(kept);
                 kept.pending = true;
                 return;
             }
@@ -280,6 +284,7 @@ struct SinkState {
                 auto it = lastFolded.find(pending.format);
                 if (it == lastFolded.end() || !it->second.pending) continue;
                 LogRecord record = it->second.record;
+                if (it->second.arguments) record.message = it->second.arguments->text(record.format);
                 it->second.pending = false;
                 record.message = foldedSummary(record.message, pending.folded, pending.seconds);
                 record.level = static_cast<LogLevel>(pending.level);
@@ -334,10 +339,29 @@ void Log::emitFormatted(LogLevel level, const LogFormat* format, ...) const {
     va_end(args);
 }
 
+std::string LogArguments::formatUnchecked(const char* format, ...) {
+    va_list args;
+    va_start(args, format);
+    std::string text = formatStringV(format, args);
+    va_end(args);
+    return text;
+}
+
+void Log::emitKept(LogLevel level, const LogFormat& format, const LogArguments& arguments) const {
+    emit(level, format, nullptr, &arguments);
+}
+
 void Log::emit(LogLevel level, const LogFormat& format, std::string_view message) const {
+    emit(level, format, &message, nullptr);
+}
+
+// Exactly one of `message` and `arguments` is given.
+void Log::emit(LogLevel level, const LogFormat& format, const std::string_view* message,
+               const LogArguments* arguments) const {
     const char* file = sourceRelative(format.file);
+    auto text = [&] { return message ? std::string(*message) : arguments->text(format.text); };
     auto makeRecord = [&] {
-        LogRecord record{_subsystem, _category, level, std::string(message)};
+        LogRecord record{_subsystem, _category, level, text()};
         record.format = format.text;
         record.file = file;
         record.line = format.line;
@@ -345,11 +369,17 @@ void Log::emit(LogLevel level, const LogFormat& format, std::string_view message
         record.context = threadContext;
         return record;
     };
-    auto keepFolded = [&](LogRecord& kept) {
+    auto keepFolded = [&](auto& folded) {
+        LogRecord& kept = folded.record;
         kept.subsystem = _subsystem;
         kept.category = _category;
         kept.level = level;
-        kept.message.assign(message);
+        if (message) {
+            kept.message.assign(*message);
+            folded.arguments.reset();
+        } else {
+            folded.arguments = *arguments;
+        }
         kept.format = format.text;
         kept.file = file;
         kept.line = format.line;

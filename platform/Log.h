@@ -5,18 +5,22 @@
 // level is on is one atomic load, so callers test it before building costly text. Lines go to the
 // journal when running as a service, to standard error otherwise, or to a sink a test installs.
 // On the way to the journal or standard error of a service a rate guard per message format
-// (LogRateGuard) folds a format that repeats quickly into one summary line a second. A line that
-// is folded is formatted on the stack and kept, as the text its summary will end with, in storage
-// its format reuses: a line written every frame allocates nothing while it folds.
+// (LogRateGuard) folds a format that repeats quickly into one summary line a second. A folded
+// line is kept, for the summary that will end with its text, in storage its format reuses: as its
+// numbers when its arguments are numbers (formatted only if a summary is written), else as its
+// text formatted on the stack. A line written every frame allocates nothing while it folds.
 
 #include <atomic>
 #include <cstdint>
+#include <cstring>
 #include <map>
 #include <memory>
 #include <mutex>
 #include <optional>
 #include <string>
 #include <string_view>
+#include <type_traits>
+#include <utility>
 #include <vector>
 
 #include "platform/LogRateGuard.h"
@@ -49,6 +53,52 @@ struct LogContext {
     std::string device;
     std::optional<uint32_t> service;
     std::optional<uint64_t> frame;
+};
+
+// The numbers of one line, kept so that it is formatted only when it is written: a line that the
+// rate guard folds (a per-frame line) stays these few bytes until a summary needs its text. Holds
+// up to kMaxArguments arithmetic values, each as it was passed; text() formats them exactly as
+// the line would have been formatted at once.
+class LogArguments {
+public:
+    static constexpr size_t kMaxArguments = 4;
+
+    template <typename... Args>
+    static constexpr bool kKeeps = sizeof...(Args) > 0 && sizeof...(Args) <= kMaxArguments &&
+                                   ((std::is_arithmetic_v<Args> && sizeof(Args) <= 16) && ...);
+
+    LogArguments() = default;
+    template <typename... Args>
+    explicit LogArguments(Args... args) : _text(&textOf<Args...>) {
+        static_assert(kKeeps<Args...>);
+        size_t slot = 0;
+        ((std::memcpy(_slots + kSlotSize * slot++, &args, sizeof args)), ...);
+    }
+
+    // The line's text for its printf-style `format`.
+    std::string text(const char* format) const { return _text ? _text(format, _slots) : std::string(); }
+
+private:
+    static constexpr size_t kSlotSize = 16;
+
+    template <typename T>
+    static T load(const unsigned char* at) {
+        T value;
+        std::memcpy(&value, at, sizeof value);
+        return value;
+    }
+    template <typename... Args, size_t... Index>
+    static std::string textOf(const char* format, const unsigned char* slots, std::index_sequence<Index...>) {
+        return formatUnchecked(format, load<Args>(slots + kSlotSize * Index)...);
+    }
+    template <typename... Args>
+    static std::string textOf(const char* format, const unsigned char* slots) {
+        return textOf<Args...>(format, slots, std::index_sequence_for<Args...>{});
+    }
+    static std::string formatUnchecked(const char* format, ...);
+
+    std::string (*_text)(const char*, const unsigned char*) = nullptr;
+    unsigned char _slots[kMaxArguments * kSlotSize] = {};
 };
 
 struct LogRecord {
@@ -95,32 +145,45 @@ public:
     // Nothing is formatted for a level that is off.
     template <typename... Args>
     void debug(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Debug)) emitFormatted(LogLevel::Debug, &format, args...);
+        if (enabled(LogLevel::Debug)) emitLine(LogLevel::Debug, format, args...);
     }
     template <typename... Args>
     void info(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Info)) emitFormatted(LogLevel::Info, &format, args...);
+        if (enabled(LogLevel::Info)) emitLine(LogLevel::Info, format, args...);
     }
     template <typename... Args>
     void log(LogFormat format, Args... args) const {  // default level
-        if (enabled(LogLevel::Default)) emitFormatted(LogLevel::Default, &format, args...);
+        if (enabled(LogLevel::Default)) emitLine(LogLevel::Default, format, args...);
     }
     template <typename... Args>
     void error(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Error)) emitFormatted(LogLevel::Error, &format, args...);
+        if (enabled(LogLevel::Error)) emitLine(LogLevel::Error, format, args...);
     }
     template <typename... Args>
     void fault(LogFormat format, Args... args) const {
-        if (enabled(LogLevel::Fault)) emitFormatted(LogLevel::Fault, &format, args...);
+        if (enabled(LogLevel::Fault)) emitLine(LogLevel::Fault, format, args...);
     }
     // A line already formatted; its format, for the rate guard, is its call site.
     void write(LogLevel level, std::string message, const char* file = __builtin_FILE(),
                unsigned line = __builtin_LINE(), const char* function = __builtin_FUNCTION()) const;
 
 private:
+    // Numbers only: kept as they are, formatted when the line is written. Anything else (a
+    // string): formatted now.
+    template <typename... Args>
+    void emitLine(LogLevel level, const LogFormat& format, Args... args) const {
+        if constexpr (LogArguments::kKeeps<Args...>) {
+            emitKept(level, format, LogArguments(args...));
+        } else {
+            emitFormatted(level, &format, args...);
+        }
+    }
     // Formats the arguments after `format` (printf-style, promoted as for any variadic call).
     void emitFormatted(LogLevel level, const LogFormat* format, ...) const;
+    void emitKept(LogLevel level, const LogFormat& format, const LogArguments& arguments) const;
     void emit(LogLevel level, const LogFormat& format, std::string_view message) const;
+    void emit(LogLevel level, const LogFormat& format, const std::string_view* message,
+              const LogArguments* arguments) const;
 
     std::string _subsystem;
     std::string _category;

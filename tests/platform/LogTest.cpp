@@ -1,5 +1,7 @@
 #include "platform/Log.h"
 
+#include "platform/Format.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -226,6 +228,24 @@ TEST_F(LogTest, EachSummaryEndsWithTheTextAndContextOfTheLastLineFoldedSinceTheO
     EXPECT_EQ(records[11].context.service, 2u);
     EXPECT_EQ(records[11].context.frame, 18u);
     EXPECT_EQ(records[11].folded, 3u);
+}
+
+TEST_F(LogTest, AFoldedLineOfNumbersIsFormattedForItsSummaryAsItWouldHaveBeenAtOnce) {
+    SystemLog::setSink(sink, true);
+    const Log log(kSubsystem, "GuardedNumbers");
+    const float third = 1.0f / 3.0f;
+    for (int line = 0; line < 12; ++line) {
+        log.log("%d %u %.9f %jx %c %lld", -line, 7u, third, static_cast<uintmax_t>(0xfeedull << line), 'a' + line,
+                -1234567890123ll);
+    }
+    SystemLog::flushFolded(true);
+    const std::vector<LogRecord> records = sink->records();
+    ASSERT_EQ(records.size(), 11u);
+    EXPECT_EQ(records[9].message, formatString("%d %u %.9f %jx %c %lld", -9, 7u, third, static_cast<uintmax_t>(0xfeedull << 9),
+                                               'a' + 9, -1234567890123ll));
+    const std::string last = formatString("%d %u %.9f %jx %c %lld", -11, 7u, third,
+                                          static_cast<uintmax_t>(0xfeedull << 11), 'a' + 11, -1234567890123ll);
+    EXPECT_EQ(records[10].message.substr(0, last.size() + 15), last + " (2 lines like ");
 }
 
 TEST_F(LogTest, FoldedErrorsAreSummarisedAtErrorLevel) {
