@@ -96,13 +96,29 @@ void PipelineRecording::recordState(uint64_t timestamp, const std::string& key, 
 }
 
 void PipelineRecording::recordInputReport(uint64_t timestamp, const uint8_t* bytes, size_t length) noexcept {
-    std::vector<uint8_t> report;
-    if (length > 0) report.assign(bytes, bytes + length);
-    appendFrame(Frame::inputReport(timestamp, std::move(report)));
+    if (_spare.empty()) {
+        std::vector<uint8_t> report;
+        if (length > 0) report.assign(bytes, bytes + length);
+        appendFrame(Frame::inputReport(timestamp, std::move(report)));
+        return;
+    }
+    // A dropped frame's node and report storage, made over into this report.
+    _frames.splice(_frames.end(), _spare, _spare.begin());
+    Frame& frame = _frames.back();
+    frame.type = FrameType::InputReport;
+    frame.timestamp = timestamp;
+    frame.key.clear();
+    frame.value.reset();
+    frame.report.assign(bytes, bytes + (length > 0 ? length : 0));
+    appended();
 }
 
 void PipelineRecording::appendFrame(Frame frame) noexcept {
     _frames.push_back(std::move(frame));
+    appended();
+}
+
+void PipelineRecording::appended() noexcept {
     // Trimming waits until the list holds twice the bound, so its cost is paid once per
     // _maxFrameCount frames, not on every report.
     if (_maxFrameCount != 0 && _frames.size() / 2 >= _maxFrameCount) trim(_maxFrameCount);
@@ -115,7 +131,7 @@ void PipelineRecording::setMaxFrameCount(uint64_t count) {
 }
 
 void PipelineRecording::trim(uint64_t maxInputReports) {
-    trimFrames(_frames, maxInputReports, &_play.iterator);
+    trimFrames(_frames, maxInputReports, &_play.iterator, &_spare, static_cast<size_t>(_maxFrameCount));
 }
 
 void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputReports) {
@@ -127,7 +143,7 @@ void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputRe
 // bound are dropped without clearing the set, so everything older than the oldest kept report is
 // one stretch: one State frame per key, the newest, which restores the settings in force.
 void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputReports,
-                                   std::list<Frame>::iterator* cursor) {
+                                   std::list<Frame>::iterator* cursor, std::list<Frame>* dropped, size_t keep) {
     if (frames.empty()) return;
     std::unordered_set<std::string> keys;
     uint64_t keptReports = 0;
@@ -154,7 +170,13 @@ void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputRe
         // Everything after this frame is decided already, so its successor is the next frame
         // that survives: a playback cursor on the removed frame moves there.
         const bool cursorHere = cursor != nullptr && *cursor == it;
-        it = frames.erase(it);
+        if (dropped != nullptr && dropped->size() < keep) {
+            const auto next = std::next(it);
+            dropped->splice(dropped->end(), frames, it);
+            it = next;
+        } else {
+            it = frames.erase(it);
+        }
         if (cursorHere) *cursor = it;
     }
 }

@@ -15,6 +15,8 @@
 //   void setState(const std::string& key, PropertyValue value);  // record a State frame, forward
 //   void handleInputReport(const uint8_t* bytes, size_t length); // record an InputReport frame, forward
 //   void appendFrame(Frame frame) noexcept;                      // append, trim at twice the bound, end playback
+//                                                               // (frames the bound drops are kept as room for
+//                                                               // later reports: a report allocates nothing then)
 //   static void trimFrames(std::list<Frame>& frames, uint64_t maxInputReports);
 //   void setMaxFrameCount(uint64_t count);                       // 0 = no bound; trims at once otherwise
 //   uint64_t maxFrameCount() const;  const std::list<Frame>& frames() const;
@@ -120,12 +122,19 @@ private:
 
     void recordState(uint64_t timestamp, const std::string& key, const PropertyValue& value) noexcept;
     void recordInputReport(uint64_t timestamp, const uint8_t* bytes, size_t length) noexcept;
-    static void trimFrames(std::list<Frame>& frames, uint64_t maxInputReports, std::list<Frame>::iterator* cursor);
+    // Frames dropped go to the end of `dropped` while it holds fewer than `keep`, else are freed.
+    static void trimFrames(std::list<Frame>& frames, uint64_t maxInputReports, std::list<Frame>::iterator* cursor,
+                           std::list<Frame>* dropped = nullptr, size_t keep = 0);
     void trim(uint64_t maxInputReports);
+    void appended() noexcept;
     void adoptCursor(const PlayCursor& cursor, const std::list<Frame>& from);
     void deliver(const Frame& frame, float speed);
 
     std::list<Frame> _frames;
+    // Frames the bound dropped, at most as many as the bound: their list nodes and report storage
+    // are taken by the next input reports, so that a report thread allocates nothing for them.
+    // Not part of the recording: copies and moves leave it.
+    std::list<Frame> _spare;
     uint64_t _maxFrameCount = 0;  // input reports to keep; 0 = no bound
     PlayCursor _play{false, _frames.end(), 0, std::nullopt, std::nullopt};
 };

@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include "common/Util.h"
 #include "tests/pipeline/FakePipelineInput.h"
 
 namespace TolkaTouch {
@@ -130,6 +131,44 @@ TEST_F(PipelineRecordingWithPipelineTest, WithBound1350TheListReaches2700Reports
     EXPECT_EQ(recording.frames().size(), 2699u);
     recording.handleInputReport(report, 1);
     EXPECT_EQ(recording.frames().size(), 1350u);
+}
+
+TEST(PipelineRecordingTest, ReportsRecordedAfterTrimsInTheRoomOfDroppedFramesHaveTheirOwnTimesAndBytes) {
+    // The frames the bound drops (reports of other lengths, settings) are made over into later
+    // reports: nothing of what they held may show.
+    FakeClock clock;
+    PipelineRecording recording;
+    recording.clock = clock.hostClock();
+    recording.setMaxFrameCount(3);
+    clock.ticks = 3;
+    recording.setState("Algs.ActivationThreshold", PropertyValue(150.0));
+    for (uint8_t tag = 1; tag <= 20; ++tag) {
+        const std::vector<uint8_t> report(tag % 4, tag);
+        clock.ticks += 3;
+        recording.handleInputReport(report.data(), report.size());
+        clock.ticks += 3;
+        if (tag == 9) recording.setState("Algs.HoldTimeoutMilliseconds", PropertyValue(700u));
+    }
+    std::vector<std::string> seen;
+    for (const Frame& frame : recording.frames()) {
+        seen.push_back(frame.type == PipelineRecording::FrameType::State ? "S " + frame.key
+                                                                         : "R " + std::to_string(frame.report.size()));
+        if (frame.type == PipelineRecording::FrameType::InputReport) {
+            EXPECT_TRUE(frame.key.empty());
+            EXPECT_FALSE(frame.value.has_value());
+            for (uint8_t byte : frame.report) EXPECT_EQ(byte, frame.report.front());
+        }
+    }
+    // The last report trimmed the list (six frames, twice the bound) to the newest three reports,
+    // 18 to 20 (18 % 4 = 2 bytes, then 3, then 0), and the newest setting of each key.
+    EXPECT_EQ(seen, (std::vector<std::string>{"S Algs.ActivationThreshold", "S Algs.HoldTimeoutMilliseconds", "R 2",
+                                              "R 3", "R 0"}));
+    uint64_t previous = 0;
+    for (const Frame& frame : recording.frames()) {
+        EXPECT_GT(frame.timestamp, previous);
+        previous = frame.timestamp;
+    }
+    EXPECT_EQ(recording.frames().back().timestamp, Util::nanosecondsFromMachTime(clock.ticks - 3));
 }
 
 TEST_F(PipelineRecordingWithPipelineTest, TrimmingKeepsTheNewestReports) {
