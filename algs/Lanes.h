@@ -52,6 +52,24 @@ inline Ints shiftDown(Ints v) {
     return __builtin_shuffle(v, Ints{}, kFrom);
 }
 
+// The mask as eight bits, lane i at bit i.
+inline uint32_t bits(Mask m) {
+#if defined(__x86_64__) && defined(__GNUC__)
+    // Each half's sign bits in one instruction of the processor's baseline.
+    using Half = float __attribute__((vector_size(16)));
+    Half low;
+    Half high;
+    std::memcpy(&low, &m, sizeof low);
+    std::memcpy(&high, reinterpret_cast<const char*>(&m) + sizeof low, sizeof high);
+    return static_cast<uint32_t>(__builtin_ia32_movmskps(low)) |
+           (static_cast<uint32_t>(__builtin_ia32_movmskps(high)) << 4);
+#else
+    uint32_t b = 0;
+    for (size_t j = 0; j < kWidth; ++j) b |= (static_cast<uint32_t>(m[j]) >> 31) << j;
+    return b;
+#endif
+}
+
 // 1 where the mask holds, else 0: the flags' form in a pixel row.
 inline Ints flag(Mask m) { return m & 1; }
 
