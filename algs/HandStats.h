@@ -109,6 +109,10 @@ public:
     bool wasHoldTimeExceeded() const { return _wasHoldTimeExceeded; }
 
 private:
+    struct RowScan;
+    // onRecord: the strongest on element's strength so far.
+    static RowScan scanRows(const RealPixels& pixels, const VirtualPixels& virtualPixels, float onRecord);
+
     bool _touching = false;
     bool _wasTouching = false;
     bool _isAboveNoise = false;
