@@ -150,15 +150,13 @@ HandStats::RowScan HandStats::scanRows(const RealPixels& pixels, const VirtualPi
     scan(pixels, 0);
     scan(virtualPixels, kRealBlocks);
 
+    // No lane holds a not-a-number, so the order in which the lanes are taken does not matter
+    // (only a zero's sign might, and the search below finds +0 and -0 alike).
     RowScan found;
-    float strongest = 0.0f;
-    float strongestOn = kNone;
-    for (size_t j = 0; j < Lanes::kWidth; ++j) {
-        strongest = std::max(strongest, strongestLanes[j]);
-        strongestOn = std::max(strongestOn, strongestOnLanes[j]);
-        found.someOn = found.someOn || someOn[j] != 0;
-        found.someAboveNoise = found.someAboveNoise || someAboveNoise[j] != 0;
-    }
+    const float strongest = Lanes::largest(strongestLanes);
+    const float strongestOn = Lanes::largest(strongestOnLanes);
+    found.someOn = Lanes::bits(someOn != 0) != 0;
+    found.someAboveNoise = Lanes::bits(someAboveNoise != 0) != 0;
 
     // The first element whose s equals m (among the on ones only when onOnly): its index and its s.
     const auto firstAt = [&](float m, bool onOnly) -> std::pair<int32_t, float> {

@@ -81,4 +81,12 @@ inline Ints select(Mask m, Ints a, Ints b) { return m ? a : b; }
 inline Floats maxOf(Floats a, Floats b) { return select(a < b, b, a); }
 inline Floats minOf(Floats a, Floats b) { return select(b < a, b, a); }
 
+// The largest lane, for lanes that hold no not-a-number, in three steps of halving.
+inline float largest(Floats v) {
+    v = maxOf(v, __builtin_shuffle(v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
+    v = maxOf(v, __builtin_shuffle(v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
+    v = maxOf(v, __builtin_shuffle(v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
+    return v[0];
+}
+
 }  // namespace TolkaTouch::Lanes

@@ -73,33 +73,39 @@ TOLKA_MACHINE_VARIANTS
 void SVM::scoreLanes(const ElementLanes& elements, float gate) {
     using Lanes::Floats;
     using Lanes::Ints;
+    using Lanes::Mask;
     constexpr size_t kBlocks = ElementLanes::kLanes / Lanes::kWidth;
 
     // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
-    // sort: something converts above the gate, or two values are at noise or above. With the
-    // same scan, which lanes are above 0 and which below: in a touch most elements read 0, and
-    // only the values either side of it need sorting.
-    uint64_t aboveGate = 0;
-    uint64_t aboveNoise = 0;
-    uint64_t positive = 0;
-    uint64_t negative = 0;
+    // sort: something converts above the gate, or two values are at noise or above.
     const Floats gates = Lanes::broadcast(gate);
+    const Ints laneBit{1, 2, 4, 8, 16, 32, 64, 128};
     alignas(32) std::array<int32_t, ElementLanes::kLanes> value;
+    std::array<Ints, kBlocks> blocks;
+    std::array<Mask, kBlocks> valid;
+    Mask aboveGate{};
+    Ints aboveNoise{};
     for (size_t b = 0; b < kBlocks; ++b) {
         const size_t at = b * Lanes::kWidth;
-        const Ints v = Lanes::load<Ints>(at < ElementLanes::kFirst ? elements.first + at
-                                                                    : elements.rest + (at - ElementLanes::kFirst));
-        Lanes::store(&value[at], v);
-        aboveGate |= laneBits(Lanes::toFloats(v) > gates, b);
-        aboveNoise |= laneBits(v > Lanes::broadcast(Pixel::kNoiseLevel), b);
-        positive |= laneBits(v > 0, b);
-        negative |= laneBits(v < 0, b);
+        blocks[b] = Lanes::load<Ints>(at < ElementLanes::kFirst ? elements.first + at
+                                                                : elements.rest + (at - ElementLanes::kFirst));
+        Lanes::store(&value[at], blocks[b]);
+        valid[b] = (laneBit & static_cast<int32_t>((elements.valid >> at) & 0xff)) != 0;
+        aboveGate |= valid[b] & (Lanes::toFloats(blocks[b]) > gates);
+        aboveNoise -= valid[b] & (blocks[b] > Lanes::broadcast(Pixel::kNoiseLevel));  // a mask lane is -1
     }
-    aboveGate &= elements.valid;
-    aboveNoise &= elements.valid;
-    if (aboveGate == 0 && std::popcount(aboveNoise) < 2) return;
-    positive &= elements.valid;
-    negative &= elements.valid;
+    int32_t aboveNoiseCount = 0;
+    for (size_t j = 0; j < Lanes::kWidth; ++j) aboveNoiseCount += aboveNoise[j];
+    if (Lanes::bits(aboveGate) == 0 && aboveNoiseCount < 2) return;
+
+    // Which lanes are above 0 and which below: in a touch most elements read 0, and only the
+    // values either side of it need sorting.
+    uint64_t positive = 0;
+    uint64_t negative = 0;
+    for (size_t b = 0; b < kBlocks; ++b) {
+        positive |= laneBits(valid[b] & (blocks[b] > 0), b);
+        negative |= laneBits(valid[b] & (blocks[b] < 0), b);
+    }
 
     // 3. Largest first: the values above 0, the zeros, the values below 0.
     const size_t count = elements.count;
