@@ -60,11 +60,49 @@ std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::spa
     return {&pixels[first], &pixels[second]};
 }
 
+// Over whole vectors, in two machine variants: the first is the earliest of the elements with the
+// largest key and, among those, the smallest index; the second the same among the others. That is
+// what the one pass over the list finds, as equal elements never displace an earlier one.
+TOLKA_MACHINE_VARIANTS
 std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pixels) {
-    return twoFirstPositions(pixels.size(), [&](size_t a, size_t b) {
-        return precedes(pixels.maxNormalizedAboveNoise[a], pixels.index[a], pixels.maxNormalizedAboveNoise[b],
-                        pixels.index[b]);
-    });
+    using Lanes::Floats;
+    using Lanes::Ints;
+    using Lanes::Mask;
+    constexpr size_t kBlocks = RealPixels::kStored / Lanes::kWidth;
+    constexpr float kLast = -std::numeric_limits<float>::infinity();
+    const Ints lane{0, 1, 2, 3, 4, 5, 6, 7};
+
+    std::array<Floats, kBlocks> key;
+    std::array<Ints, kBlocks> index;
+    std::array<Mask, kBlocks> candidate;
+    for (size_t b = 0; b < kBlocks; ++b) {
+        const Floats m = Lanes::load<Floats>(&pixels.maxNormalizedAboveNoise[b * Lanes::kWidth]);
+        key[b] = Lanes::select(m != m, Lanes::broadcast(kLast), m);
+        index[b] = Lanes::load<Ints>(&pixels.index[b * Lanes::kWidth]);
+        candidate[b] = lane + static_cast<int32_t>(b * Lanes::kWidth) < static_cast<int32_t>(RealPixels::size());
+    }
+    const auto first = [&] {
+        Floats best = Lanes::broadcast(kLast);
+        for (size_t b = 0; b < kBlocks; ++b) best = Lanes::maxOf(best, Lanes::select(candidate[b], key[b], best));
+        const Floats largest = Lanes::broadcast(Lanes::largest(best));
+        Ints smallest = Lanes::broadcast(std::numeric_limits<int32_t>::max());
+        std::array<Mask, kBlocks> atLargest;
+        for (size_t b = 0; b < kBlocks; ++b) {
+            atLargest[b] = candidate[b] & (key[b] == largest);
+            smallest = Lanes::select(atLargest[b] & (index[b] < smallest), index[b], smallest);
+        }
+        const Ints smallestIndex = Lanes::broadcast(Lanes::smallest(smallest));
+        for (size_t b = 0; b < kBlocks; ++b) {
+            if (const uint32_t bits = Lanes::bits(atLargest[b] & (index[b] == smallestIndex)); bits != 0) {
+                const size_t at = static_cast<size_t>(std::countr_zero(bits));
+                candidate[b] &= lane != static_cast<int32_t>(at);
+                return b * Lanes::kWidth + at;
+            }
+        }
+        return size_t{0};
+    };
+    const size_t firstAt = first();
+    return {firstAt, first()};
 }
 
 HandStats::HandStats() = default;

@@ -29,9 +29,9 @@ inline void store(void* to, V v) {
     std::memcpy(to, &v, sizeof v);
 }
 
-// Written out lane by lane: adding x to zeros would turn -0.0 into 0.0.
-inline Floats broadcast(float x) { return Floats{x, x, x, x, x, x, x, x}; }
-inline Ints broadcast(int32_t x) { return Ints{x, x, x, x, x, x, x, x}; }
+// Lane 0 copied into every lane (adding x to zeros would turn -0.0 into 0.0).
+inline Floats broadcast(float x) { return __builtin_shuffle(Floats{x}, Ints{}); }
+inline Ints broadcast(int32_t x) { return __builtin_shuffle(Ints{x}, Ints{}); }
 
 inline Floats toFloats(Ints v) { return __builtin_convertvector(v, Floats); }
 // Truncation toward zero of lanes that are inside the 32-bit range.
@@ -86,6 +86,15 @@ inline float largest(Floats v) {
     v = maxOf(v, __builtin_shuffle(v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
     v = maxOf(v, __builtin_shuffle(v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
     v = maxOf(v, __builtin_shuffle(v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
+    return v[0];
+}
+
+// The smallest lane.
+inline int32_t smallest(Ints v) {
+    const auto lesser = [](Ints a, Ints b) { return select(b < a, b, a); };
+    v = lesser(v, __builtin_shuffle(v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
+    v = lesser(v, __builtin_shuffle(v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
+    v = lesser(v, __builtin_shuffle(v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
     return v[0];
 }
 

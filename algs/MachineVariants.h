@@ -7,7 +7,7 @@
 // cannot be a function, hence the macro.
 
 #if defined(__x86_64__) && defined(__GNUC__) && !defined(__clang__) && !defined(__SANITIZE_THREAD__)
-#define TOLKA_MACHINE_VARIANTS __attribute__((target_clones("arch=x86-64-v3", "default")))
+#define TOLKA_MACHINE_VARIANTS __attribute__((target_clones("arch=x86-64-v4", "arch=x86-64-v3", "default")))
 #else
 #define TOLKA_MACHINE_VARIANTS
 #endif

@@ -78,22 +78,24 @@ inline T splat(S s) {
 }
 
 // Truncation toward zero. The product of a fixed gain and a 16-bit reading always fits; anything
-// else (a gain that is not a number, or huge) saturates instead of overflowing. Written with
-// selects, not branches: the conversion only ever sees a number inside the 32-bit range.
+// else (a gain that is not a number, or huge) saturates instead of overflowing, and not-a-number
+// gives 0. Written with selects, not branches: the conversion only ever sees a number inside the
+// 32-bit range. Eight lanes are first held inside [-2^31, 2^31): the bottom converts to INT32_MIN
+// itself, the top is replaced after.
 template <typename F, typename I>
 inline I truncateToInt32(F x) {
     const F upper = splat<F>(2147483648.0f);
     const F lower = splat<F>(-2147483648.0f);
     const auto high = x >= upper;
-    const auto low = x <= lower;
-    const auto inRange = (x > lower) & (x < upper);  // false for not-a-number
-    I truncated;
     if constexpr (std::is_arithmetic_v<F>) {
-        truncated = static_cast<I>(inRange ? x : 0.0f);
+        const bool inRange = (x > lower) & (x < upper);  // false for not-a-number
+        const I truncated = static_cast<I>(inRange ? x : 0.0f);
+        return high ? INT32_MAX : x <= lower ? INT32_MIN : truncated;
     } else {
-        truncated = Lanes::toInts(select(inRange, x, F{}));
+        const F belowUpper = splat<F>(2147483520.0f);  // the largest float below 2^31
+        const F held = select(x != x, F{}, minOf(maxOf(x, lower), belowUpper));
+        return select(high, splat<I>(INT32_MAX), Lanes::toInts(held));
     }
-    return select(high, splat<I>(INT32_MAX), select(low, splat<I>(INT32_MIN), truncated));
 }
 
 // One element's frame (the steps of Pixel::updatePixelState), on its fields wherever they live:

@@ -145,7 +145,7 @@ void VirtualImage::updateValues(const RealPixels::Row<int32_t>& pixels, VirtualP
             recorded[b] = Lanes::load<Ints>(&row[b * Lanes::kWidth]);
             outside |= (recorded[b] < 0) | (recorded[b] >= static_cast<int32_t>(kPixelCount));
         }
-        for (size_t j = 0; j < Lanes::kWidth; ++j) fast = fast && outside[j] == 0;
+        fast = Lanes::bits(outside) == 0;
     }
     if (!fast) {
         // Anything else takes the steps one member at a time, with their range tests.
