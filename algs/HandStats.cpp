@@ -149,6 +149,7 @@ struct HandStats::RowScan {
     float strongestOnStrength = 0.0f;
     bool someOn = false;
     bool someAboveNoise = false;
+    int32_t nonActive = 0;  // elements above noise that were never on during the touch
 };
 
 // With s = max(normalized, 0), this frame's strongest element is the first whose s is the largest
@@ -172,6 +173,7 @@ HandStats::RowScan HandStats::scanRows(const RealPixels& pixels, const VirtualPi
     Floats strongestOnLanes = Lanes::broadcast(kNone);
     Ints someOn{};
     Ints someAboveNoise{};
+    Ints nonActive{};
     const auto scan = [&](const auto& row, size_t first) {
         for (size_t b = 0; b < row.kStored / Lanes::kWidth; ++b) {
             const size_t at = b * Lanes::kWidth;
@@ -183,6 +185,7 @@ HandStats::RowScan HandStats::scanRows(const RealPixels& pixels, const VirtualPi
                                                                            Lanes::broadcast(kNone)));
             someOn |= isOn;
             someAboveNoise |= Lanes::load<Ints>(&row.aboveNoise[at]);
+            nonActive += Lanes::load<Ints>(&row.wasAboveNoise[at]) & (Lanes::load<Ints>(&row.wasOn[at]) ^ 1);
         }
     };
     scan(pixels, 0);
@@ -195,6 +198,7 @@ HandStats::RowScan HandStats::scanRows(const RealPixels& pixels, const VirtualPi
     const float strongestOn = Lanes::largest(strongestOnLanes);
     found.someOn = Lanes::bits(someOn != 0) != 0;
     found.someAboveNoise = Lanes::bits(someAboveNoise != 0) != 0;
+    for (size_t j = 0; j < Lanes::kWidth; ++j) found.nonActive += nonActive[j];
 
     // The first element whose s equals m (among the on ones only when onOnly): its index and its s.
     const auto firstAt = [&](float m, bool onOnly) -> std::pair<int32_t, float> {
@@ -250,7 +254,7 @@ void HandStats::updateHandState(const RealPixels& pixels, const VirtualPixels& v
 
     // 5.
     updateTouchScore(pixels, virtualPixels, time);
-    updateTapRejection(pixels, virtualPixels);
+    updateTapRejection(scan.nonActive);
 
     // 6. Last frame's flags; the exceed flag from before this frame's decision decides the tap.
     _wasHolding = _holding;
@@ -467,6 +471,16 @@ PixelRegion HandStats::changeActiveRegion(const RealPixels& pixels, int index) {
 }
 
 void HandStats::updateTapRejection(const RealPixels& pixels, const VirtualPixels& virtualPixels) {
+    // 4. Elements above noise that were never on during the touch.
+    int32_t nonActive = 0;
+    for (size_t i = 0; i < pixels.size(); ++i) nonActive += pixels.wasAboveNoise[i] & (pixels.wasOn[i] ^ 1);
+    for (size_t i = 0; i < virtualPixels.size(); ++i) {
+        nonActive += virtualPixels.wasAboveNoise[i] & (virtualPixels.wasOn[i] ^ 1);
+    }
+    updateTapRejection(nonActive);
+}
+
+void HandStats::updateTapRejection(int32_t nonActive) {
     // 1.
     peakStrength = maxOnStrength * ActivationThreshold;
 
@@ -486,14 +500,7 @@ void HandStats::updateTapRejection(const RealPixels& pixels, const VirtualPixels
     }
     if (duration != 0) strengthPerDuration = peakStrength / static_cast<float>(duration) - 0.65f;
 
-    // 4. Elements above noise that were never on during the touch.
-    int32_t nonActive = 0;
-    for (size_t i = 0; i < pixels.size(); ++i) nonActive += pixels.wasAboveNoise[i] & (pixels.wasOn[i] ^ 1);
-    for (size_t i = 0; i < virtualPixels.size(); ++i) {
-        nonActive += virtualPixels.wasAboveNoise[i] & (virtualPixels.wasOn[i] ^ 1);
-    }
-
-    // 5., 6.
+    // 5., 6. (4. is the count of elements given.)
     activePixelCount = 21 - nonActive;
     tapScore = 0.1886f * static_cast<float>(activePixelCount) + 0.2772f * strengthRate + 2.7205f * durationRatio -
                2.4116f;
