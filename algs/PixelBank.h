@@ -134,7 +134,7 @@ void PixelBank<N>::set(size_t i, const Pixel& p) {
 }
 
 // The 15 real pixels A..O, and the 23 virtual pixels in group order. Their update is compiled
-// once, in the library, where the build lets the vectoriser turn the loop into vector code.
+// once, in the library, in each machine variant.
 using RealPixels = PixelBank<kPixelCount>;
 using VirtualPixels = PixelBank<kVirtualPixelCount>;
 
