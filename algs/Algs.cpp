@@ -75,17 +75,15 @@ void Algs::processTouchFrame(const int16_t* readings, uint32_t frameNumber, uint
     // 1. The real pixels, in index order.
     pixels.update(std::span<const int16_t, kPixelCount>(readings, kPixelCount), threshold);
 
-    // 2. The group sums.
-    virtualImage.updateValues(std::span(pixels.value).first<kPixelCount>());
+    // 2. The group sums, and each as its virtual pixel reads it: narrowed to 16 bits.
+    VirtualPixels::Row<int32_t> groupReadings;
+    virtualImage.updateValues(pixels.value, groupReadings);
 
-    // 3. The virtual pixels. The group sum is narrowed to 16 bits, so one above 32767 wraps to a
-    // negative value; the tuned factors and thresholds expect exactly that.
+    // 3. The virtual pixels.
     if (virtualImage.values.size() < kVirtualPixelCount || virtualImage.strongest.size() < kVirtualPixelCount) {
         throw std::out_of_range("vector");
     }
-    std::array<int16_t, kVirtualPixelCount> sums;
-    for (size_t i = 0; i < kVirtualPixelCount; ++i) sums[i] = static_cast<int16_t>(virtualImage.values[i]);
-    virtualPixels.update(sums, threshold);
+    virtualPixels.update(groupReadings, threshold);
     std::copy_n(virtualImage.strongest.begin(), kVirtualPixelCount, virtualPixels.index.begin());
 
     // 4. The hand state machine reads both pixel rows, and decides once what the frame did.

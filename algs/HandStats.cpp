@@ -1,11 +1,14 @@
 #include "algs/HandStats.h"
 
+#include "algs/Lanes.h"
+#include "algs/MachineVariants.h"
+
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <limits>
 #include <stdexcept>
 #include <tuple>
-#include <type_traits>
 #include <utility>
 
 namespace TolkaTouch {
@@ -57,11 +60,49 @@ std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::spa
     return {&pixels[first], &pixels[second]};
 }
 
+// Over whole vectors, in two machine variants: the first is the earliest of the elements with the
+// largest key and, among those, the smallest index; the second the same among the others. That is
+// what the one pass over the list finds, as equal elements never displace an earlier one.
+TOLKA_MACHINE_VARIANTS
 std::pair<size_t, size_t> twoFirstByMaxNormalizedAboveNoise(const RealPixels& pixels) {
-    return twoFirstPositions(pixels.size(), [&](size_t a, size_t b) {
-        return precedes(pixels.maxNormalizedAboveNoise[a], pixels.index[a], pixels.maxNormalizedAboveNoise[b],
-                        pixels.index[b]);
-    });
+    using Lanes::Floats;
+    using Lanes::Ints;
+    using Lanes::Mask;
+    constexpr size_t kBlocks = RealPixels::kStored / Lanes::kWidth;
+    constexpr float kLast = -std::numeric_limits<float>::infinity();
+    const Ints lane{0, 1, 2, 3, 4, 5, 6, 7};
+
+    std::array<Floats, kBlocks> key;
+    std::array<Ints, kBlocks> index;
+    std::array<Mask, kBlocks> candidate;
+    for (size_t b = 0; b < kBlocks; ++b) {
+        const Floats m = Lanes::load<Floats>(&pixels.maxNormalizedAboveNoise[b * Lanes::kWidth]);
+        key[b] = Lanes::select(m != m, Lanes::broadcast(kLast), m);
+        index[b] = Lanes::load<Ints>(&pixels.index[b * Lanes::kWidth]);
+        candidate[b] = lane + static_cast<int32_t>(b * Lanes::kWidth) < static_cast<int32_t>(RealPixels::size());
+    }
+    const auto first = [&] {
+        Floats best = Lanes::broadcast(kLast);
+        for (size_t b = 0; b < kBlocks; ++b) best = Lanes::maxOf(best, Lanes::select(candidate[b], key[b], best));
+        const Floats largest = Lanes::broadcast(Lanes::largest(best));
+        Ints smallest = Lanes::broadcast(std::numeric_limits<int32_t>::max());
+        std::array<Mask, kBlocks> atLargest;
+        for (size_t b = 0; b < kBlocks; ++b) {
+            atLargest[b] = candidate[b] & (key[b] == largest);
+            smallest = Lanes::select(atLargest[b] & (index[b] < smallest), index[b], smallest);
+        }
+        const Ints smallestIndex = Lanes::broadcast(Lanes::smallest(smallest));
+        for (size_t b = 0; b < kBlocks; ++b) {
+            if (const uint32_t bits = Lanes::bits(atLargest[b] & (index[b] == smallestIndex)); bits != 0) {
+                const size_t at = static_cast<size_t>(std::countr_zero(bits));
+                candidate[b] &= lane != static_cast<int32_t>(at);
+                return b * Lanes::kWidth + at;
+            }
+        }
+        return size_t{0};
+    };
+    const size_t firstAt = first();
+    return {firstAt, first()};
 }
 
 HandStats::HandStats() = default;
@@ -100,68 +141,97 @@ void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<cons
     updateTapRejection(RealPixels::of(pixels), VirtualPixels::of(virtualPixels));
 }
 
+// What the hand state reads first from both rows, real pixels then virtual ones.
+struct HandStats::RowScan {
+    int32_t strongestIndex = 0;  // this frame's strongest element, 0 when none is above 0
+    bool newStrongestOn = false;  // an on element is stronger than the record given
+    int32_t strongestOnIndex = 0; // ... the first such, and its strength
+    float strongestOnStrength = 0.0f;
+    bool someOn = false;
+    bool someAboveNoise = false;
+    int32_t nonActive = 0;  // elements above noise that were never on during the touch
+};
+
+// With s = max(normalized, 0), this frame's strongest element is the first whose s is the largest
+// s (when above 0), and the strongest on element the first on one whose s is the largest on s.
+// That is what a scan keeping each strictly stronger element finds; not-a-number strengths never
+// win either way. Padding lanes are never on and their s is never above 0. Eight lanes at a time,
+// in two machine variants.
+TOLKA_MACHINE_VARIANTS
+HandStats::RowScan HandStats::scanRows(const RealPixels& pixels, const VirtualPixels& virtualPixels,
+                                       float onRecord) {
+    using Lanes::Floats;
+    using Lanes::Ints;
+    using Lanes::Mask;
+    constexpr size_t kRealBlocks = RealPixels::kStored / Lanes::kWidth;
+    constexpr size_t kBlocks = kRealBlocks + VirtualPixels::kStored / Lanes::kWidth;
+    constexpr float kNone = -std::numeric_limits<float>::infinity();
+
+    std::array<Floats, kBlocks> strength;
+    std::array<Mask, kBlocks> on;
+    Floats strongestLanes{};
+    Floats strongestOnLanes = Lanes::broadcast(kNone);
+    Ints someOn{};
+    Ints someAboveNoise{};
+    Ints nonActive{};
+    const auto scan = [&](const auto& row, size_t first) {
+        for (size_t b = 0; b < row.kStored / Lanes::kWidth; ++b) {
+            const size_t at = b * Lanes::kWidth;
+            const Ints isOn = Lanes::load<Ints>(&row.isOn[at]);
+            strength[first + b] = Lanes::maxOf(Lanes::load<Floats>(&row.normalized[at]), Floats{});
+            on[first + b] = isOn != 0;
+            strongestLanes = Lanes::maxOf(strongestLanes, strength[first + b]);
+            strongestOnLanes = Lanes::maxOf(strongestOnLanes, Lanes::select(on[first + b], strength[first + b],
+                                                                           Lanes::broadcast(kNone)));
+            someOn |= isOn;
+            someAboveNoise |= Lanes::load<Ints>(&row.aboveNoise[at]);
+            nonActive += Lanes::load<Ints>(&row.wasAboveNoise[at]) & (Lanes::load<Ints>(&row.wasOn[at]) ^ 1);
+        }
+    };
+    scan(pixels, 0);
+    scan(virtualPixels, kRealBlocks);
+
+    // No lane holds a not-a-number, so the order in which the lanes are taken does not matter
+    // (only a zero's sign might, and the search below finds +0 and -0 alike).
+    RowScan found;
+    const float strongest = Lanes::largest(strongestLanes);
+    const float strongestOn = Lanes::largest(strongestOnLanes);
+    found.someOn = Lanes::bits(someOn != 0) != 0;
+    found.someAboveNoise = Lanes::bits(someAboveNoise != 0) != 0;
+    for (size_t j = 0; j < Lanes::kWidth; ++j) found.nonActive += nonActive[j];
+
+    // The first element whose s equals m (among the on ones only when onOnly): its index and its s.
+    const auto firstAt = [&](float m, bool onOnly) -> std::pair<int32_t, float> {
+        for (size_t b = 0; b < kBlocks; ++b) {
+            const Mask at = (strength[b] == Lanes::broadcast(m)) & (onOnly ? on[b] : Mask{} - 1);
+            if (const uint32_t bits = Lanes::bits(at); bits != 0) {
+                const size_t lane = static_cast<size_t>(std::countr_zero(bits));
+                const float s = strength[b][lane];
+                if (b < kRealBlocks) return {pixels.index[b * Lanes::kWidth + lane], s};
+                return {virtualPixels.index[(b - kRealBlocks) * Lanes::kWidth + lane], s};
+            }
+        }
+        return {0, 0.0f};
+    };
+    if (strongest > 0.0f) found.strongestIndex = firstAt(strongest, false).first;
+    if (strongestOn > onRecord) {
+        found.newStrongestOn = true;
+        std::tie(found.strongestOnIndex, found.strongestOnStrength) = firstAt(strongestOn, true);
+    }
+    return found;
+}
+
 void HandStats::updateHandState(const RealPixels& pixels, const VirtualPixels& virtualPixels, unsigned int time) {
     // 1. Scan the real pixels, then the virtual ones: the strongest on element since the last
     // Reset, whether anything is on or above noise, and this frame's strongest element.
-    // Read as the rows' maxima first, eight lanes at a time, which the compiler turns into vector
-    // code: with s = max(normalized, 0), this frame's strongest element is the first whose s is
-    // the largest s (when above 0), and the strongest on element the first on one whose s is the
-    // largest on s (when above the record). That is what a scan keeping each strictly stronger
-    // element finds; not-a-number strengths never win either way. Padding lanes are never on and
-    // their s is never above 0.
-    constexpr float kNone = -std::numeric_limits<float>::infinity();
-    std::array<float, 8> strongestLanes{};
-    std::array<float, 8> strongestOnLanes;
-    strongestOnLanes.fill(kNone);
-    int32_t someOnLanes = 0;
-    int32_t someAboveNoiseLanes = 0;
-    const auto maxima = [&](const auto& row) {
-        static_assert(std::remove_cvref_t<decltype(row)>::kLanes == 8);
-        for (size_t b = 0; b < row.normalized.size(); b += 8) {
-            for (size_t j = 0; j < 8; ++j) {
-                const float s = std::max(row.normalized[b + j], 0.0f);
-                const int32_t on = row.isOn[b + j];
-                strongestLanes[j] = std::max(strongestLanes[j], s);
-                strongestOnLanes[j] = std::max(strongestOnLanes[j], on != 0 ? s : kNone);
-                someOnLanes |= on;
-                someAboveNoiseLanes |= row.aboveNoise[b + j];
-            }
-        }
-    };
-    maxima(pixels);
-    maxima(virtualPixels);
-    float strongest = 0.0f;
-    float strongestOn = kNone;
-    for (size_t j = 0; j < 8; ++j) {
-        strongest = std::max(strongest, strongestLanes[j]);
-        strongestOn = std::max(strongestOn, strongestOnLanes[j]);
+    const RowScan scan = scanRows(pixels, virtualPixels, maxOnStrength);
+    const int32_t strongestIndex = scan.strongestIndex;
+    if (scan.newStrongestOn) {
+        maxOnStrength = scan.strongestOnStrength;
+        maxOnIndex = scan.strongestOnIndex;
     }
-    const bool someOn = someOnLanes != 0;
-    const bool someAboveNoise = someAboveNoiseLanes != 0;
-
-    // The first element, real pixels then virtual ones, whose s equals m (among the on ones only
-    // when onOnly): its index and its own s.
-    const auto firstAt = [&](float m, bool onOnly) -> std::pair<int32_t, float> {
-        const auto search = [&](const auto& row, std::pair<int32_t, float>& found) {
-            for (size_t i = 0; i < row.size(); ++i) {
-                const float s = std::max(row.normalized[i], 0.0f);
-                if (s == m && (!onOnly || row.isOn[i] != 0)) {
-                    found = {row.index[i], s};
-                    return true;
-                }
-            }
-            return false;
-        };
-        std::pair<int32_t, float> found{0, 0.0f};
-        if (!search(pixels, found)) search(virtualPixels, found);
-        return found;
-    };
-    const int32_t strongestIndex = strongest > 0.0f ? firstAt(strongest, false).first : 0;
-    float maxOn = maxOnStrength;
-    int32_t maxOnAt = maxOnIndex;
-    if (strongestOn > maxOn) std::tie(maxOnAt, maxOn) = firstAt(strongestOn, true);
-    maxOnStrength = maxOn;
-    maxOnIndex = maxOnAt;
+    const bool someOn = scan.someOn;
+    const bool someAboveNoise = scan.someAboveNoise;
 
     // 2.
     _wasTouching = _touching;
@@ -184,7 +254,7 @@ void HandStats::updateHandState(const RealPixels& pixels, const VirtualPixels& v
 
     // 5.
     updateTouchScore(pixels, virtualPixels, time);
-    updateTapRejection(pixels, virtualPixels);
+    updateTapRejection(scan.nonActive);
 
     // 6. Last frame's flags; the exceed flag from before this frame's decision decides the tap.
     _wasHolding = _holding;
@@ -401,6 +471,16 @@ PixelRegion HandStats::changeActiveRegion(const RealPixels& pixels, int index) {
 }
 
 void HandStats::updateTapRejection(const RealPixels& pixels, const VirtualPixels& virtualPixels) {
+    // 4. Elements above noise that were never on during the touch.
+    int32_t nonActive = 0;
+    for (size_t i = 0; i < pixels.size(); ++i) nonActive += pixels.wasAboveNoise[i] & (pixels.wasOn[i] ^ 1);
+    for (size_t i = 0; i < virtualPixels.size(); ++i) {
+        nonActive += virtualPixels.wasAboveNoise[i] & (virtualPixels.wasOn[i] ^ 1);
+    }
+    updateTapRejection(nonActive);
+}
+
+void HandStats::updateTapRejection(int32_t nonActive) {
     // 1.
     peakStrength = maxOnStrength * ActivationThreshold;
 
@@ -420,14 +500,7 @@ void HandStats::updateTapRejection(const RealPixels& pixels, const VirtualPixels
     }
     if (duration != 0) strengthPerDuration = peakStrength / static_cast<float>(duration) - 0.65f;
 
-    // 4. Elements above noise that were never on during the touch.
-    int32_t nonActive = 0;
-    for (size_t i = 0; i < pixels.size(); ++i) nonActive += pixels.wasAboveNoise[i] & (pixels.wasOn[i] ^ 1);
-    for (size_t i = 0; i < virtualPixels.size(); ++i) {
-        nonActive += virtualPixels.wasAboveNoise[i] & (virtualPixels.wasOn[i] ^ 1);
-    }
-
-    // 5., 6.
+    // 5., 6. (4. is the count of elements given.)
     activePixelCount = 21 - nonActive;
     tapScore = 0.1886f * static_cast<float>(activePixelCount) + 0.2772f * strengthRate + 2.7205f * durationRatio -
                2.4116f;

@@ -109,6 +109,12 @@ public:
     bool wasHoldTimeExceeded() const { return _wasHoldTimeExceeded; }
 
 private:
+    struct RowScan;
+    // Tap rejection with the count of elements above noise that were never on during the touch.
+    void updateTapRejection(int32_t nonActive);
+    // onRecord: the strongest on element's strength so far.
+    static RowScan scanRows(const RealPixels& pixels, const VirtualPixels& virtualPixels, float onRecord);
+
     bool _touching = false;
     bool _wasTouching = false;
     bool _isAboveNoise = false;

@@ -5,7 +5,9 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <type_traits>
 
+#include "algs/Lanes.h"
 #include "common/Reports.h"
 
 namespace TolkaTouch {
@@ -44,67 +46,104 @@ public:
 
 namespace PixelDetail {
 
+// The steps below are written once for a single element (float, int32_t, a bool condition) and
+// for eight elements at a time (Lanes::Floats, Lanes::Ints, Lanes::Mask); these give each step
+// its meaning for a single element.
+inline float toFloat(int32_t x) { return static_cast<float>(x); }
+inline Lanes::Floats toFloat(Lanes::Ints x) { return Lanes::toFloats(x); }
+inline float select(bool m, float a, float b) { return m ? a : b; }
+inline int32_t select(bool m, int32_t a, int32_t b) { return m ? a : b; }
+using Lanes::select;
+inline float maxOf(float a, float b) { return std::max(a, b); }
+inline float minOf(float a, float b) { return std::min(a, b); }
+using Lanes::maxOf;
+using Lanes::minOf;
+// A condition as a stored flag: a bool in a Pixel, 0 or 1 in a 32-bit lane.
+template <typename Flag>
+inline Flag asFlag(bool m) {
+    return static_cast<Flag>(m);
+}
+template <typename Flag>
+inline Flag asFlag(Lanes::Mask m) {
+    return Lanes::flag(m);
+}
+// The same constant in every lane.
+template <typename T, typename S>
+inline T splat(S s) {
+    if constexpr (std::is_arithmetic_v<T>) {
+        return static_cast<T>(s);
+    } else {
+        return Lanes::broadcast(s);
+    }
+}
+
 // Truncation toward zero. The product of a fixed gain and a 16-bit reading always fits; anything
-// else (a gain that is not a number, or huge) saturates instead of overflowing. Written with
-// selects, not branches, so that a loop of them becomes vector code: the conversion only ever sees
-// a number inside the 32-bit range.
-inline int32_t truncateToInt32(float x) {
-    const bool high = x >= 2147483648.0f;
-    const bool low = x <= -2147483648.0f;
-    const bool inRange = (x > -2147483648.0f) & (x < 2147483648.0f);  // false for not-a-number
-    const int32_t truncated = static_cast<int32_t>(inRange ? x : 0.0f);
-    return high ? INT32_MAX : low ? INT32_MIN : truncated;
+// else (a gain that is not a number, or huge) saturates instead of overflowing, and not-a-number
+// gives 0. Written with selects, not branches: the conversion only ever sees a number inside the
+// 32-bit range. Eight lanes are first held inside [-2^31, 2^31): the bottom converts to INT32_MIN
+// itself, the top is replaced after.
+template <typename F, typename I>
+inline I truncateToInt32(F x) {
+    const F upper = splat<F>(2147483648.0f);
+    const F lower = splat<F>(-2147483648.0f);
+    const auto high = x >= upper;
+    if constexpr (std::is_arithmetic_v<F>) {
+        const bool inRange = (x > lower) & (x < upper);  // false for not-a-number
+        const I truncated = static_cast<I>(inRange ? x : 0.0f);
+        return high ? INT32_MAX : x <= lower ? INT32_MIN : truncated;
+    } else {
+        const F belowUpper = splat<F>(2147483520.0f);  // the largest float below 2^31
+        const F held = select(x != x, F{}, minOf(maxOf(x, lower), belowUpper));
+        return select(high, splat<I>(INT32_MAX), Lanes::toInts(held));
+    }
 }
 
 // One element's frame (the steps of Pixel::updatePixelState), on its fields wherever they live:
-// in a Pixel, or at one index of a PixelBank's rows. Every field is assigned by a select rather
-// than under a branch, so that a loop over many elements becomes vector code; each step is one
-// IEEE operation, which gives the same bits in a vector lane as in a scalar register. A flag is a
-// bool in a Pixel and a 32-bit 0 or 1 in a bank, a width the vectoriser handles beside floats.
-template <typename Flag>
-inline void updateElement(int raw, float divisor, float gain, int32_t& value, float& normalized, float& peak,
-                          float& valley, Flag& isOn, Flag& aboveNoise, Flag& wasAboveNoise, Flag& wasOn,
-                          float& maxNormalizedAboveNoise) {
-    constexpr float kHysteresis = Pixel::kHysteresis;
-    constexpr int32_t kNoiseLevel = Pixel::kNoiseLevel;
+// in a Pixel, or eight at a time in a PixelBank's rows. Every field is assigned by a select rather
+// than under a branch; each step is one IEEE operation, which gives the same bits in a vector lane
+// as in a scalar register.
+template <typename F, typename I, typename Flag>
+inline void updateElement(I raw, F divisor, F gain, I& value, F& normalized, F& peak, F& valley, Flag& isOn,
+                          Flag& aboveNoise, Flag& wasAboveNoise, Flag& wasOn, F& maxNormalizedAboveNoise) {
+    const F hysteresis = splat<F>(Pixel::kHysteresis);
 
     // 1. Scale.
-    const int32_t v = truncateToInt32(gain * static_cast<float>(raw));
+    const I v = truncateToInt32<F, I>(gain * toFloat(raw));
 
     // 2. Threshold from last frame's state: off at 60 % of the peak; on above valley / 0.6, but
     // never at a normalised value of 1.0 or less.
-    const float offThreshold = peak * kHysteresis;
-    const float onThreshold = std::max(valley / kHysteresis, 1.0f);
-    const float threshold = isOn != 0 ? offThreshold : onThreshold;
+    const F offThreshold = peak * hysteresis;
+    const F onThreshold = maxOf(valley / hysteresis, splat<F>(1.0f));
+    const F threshold = select(isOn != splat<Flag>(0), offThreshold, onThreshold);
 
     // 3. Normalise; 4. decide.
-    const float n = static_cast<float>(v) / divisor;
-    const bool on = n > threshold;
+    const F n = toFloat(v) / divisor;
+    const auto on = n > threshold;
 
     // 5. Follow the peak while on, the valley while off.
-    const float peakIfOn = std::max(n, peak);
-    const float valleyIfOff = std::min(n, valley);
-    peak = on ? peakIfOn : n;
-    valley = on ? n : valleyIfOff;
-    wasOn = static_cast<Flag>(wasOn | on);
+    const F peakIfOn = maxOf(n, peak);
+    const F valleyIfOff = minOf(n, valley);
+    peak = select(on, peakIfOn, n);
+    valley = select(on, n, valleyIfOff);
+    wasOn = wasOn | asFlag<Flag>(on);
 
     // 6., 7. Noise statistics.
-    const bool above = v > kNoiseLevel;
-    const float maxIfAbove = std::max(n, maxNormalizedAboveNoise);
-    maxNormalizedAboveNoise = above ? maxIfAbove : maxNormalizedAboveNoise;
-    wasAboveNoise = static_cast<Flag>(wasAboveNoise | above);
-    aboveNoise = static_cast<Flag>(above);
+    const auto above = v > splat<I>(Pixel::kNoiseLevel);
+    const F maxIfAbove = maxOf(n, maxNormalizedAboveNoise);
+    maxNormalizedAboveNoise = select(above, maxIfAbove, maxNormalizedAboveNoise);
+    wasAboveNoise = wasAboveNoise | asFlag<Flag>(above);
+    aboveNoise = asFlag<Flag>(above);
     value = v;
     normalized = n;
-    isOn = static_cast<Flag>(on);
+    isOn = asFlag<Flag>(on);
 }
 
 }  // namespace PixelDetail
 
 // Inline: the call would cost as much as the work.
 inline void Pixel::updatePixelState(int raw, float divisor) {
-    PixelDetail::updateElement(raw, divisor, gain, value, normalized, peak, valley, isOn, aboveNoise, wasAboveNoise,
-                               wasOn, maxNormalizedAboveNoise);
+    PixelDetail::updateElement<float, int32_t, bool>(raw, divisor, gain, value, normalized, peak, valley, isOn,
+                                                     aboveNoise, wasAboveNoise, wasOn, maxNormalizedAboveNoise);
 }
 
 }  // namespace TolkaTouch

@@ -10,6 +10,7 @@
 #include <span>
 #include <stdexcept>
 
+#include "algs/Lanes.h"
 #include "algs/Pixel.h"
 #include "common/Reports.h"
 #include "tolkatouch/FrameSnapshot.h"
@@ -39,7 +40,14 @@ public:
     static constexpr size_t size() { return N; }
 
     // One frame for every element: raw[i] as Pixel::updatePixelState(raw[i], divisor) on element i.
+    // The padding lanes of raw must read 0.
+    void update(const Row<int32_t>& raw, float divisor);
     void update(std::span<const int16_t, N> raw, float divisor);
+    // A frame's readings (16-bit readings, or any 32-bit values) as a row, padding lanes 0. Read a
+    // whole vector at a time: the row is written as the update reads it, which a copy element by
+    // element would hold up.
+    template <typename T>
+    static Row<int32_t> rowOf(std::span<const T, N> raw);
     // Pixel::resetGlobalStats on every element.
     void resetGlobalStats();
 
@@ -60,6 +68,9 @@ public:
     alignas(32) Row<int32_t> wasOn{};
     alignas(32) Row<float> maxNormalizedAboveNoise{};
     alignas(32) Row<int32_t> index{};
+
+private:
+    void updateRows(const Row<int32_t>& raw, float divisor);
 };
 
 template <size_t N>
@@ -69,6 +80,20 @@ PixelBank<N> PixelBank<N>::of(std::span<const P> pixels) {
     PixelBank bank({}, {});
     for (size_t i = 0; i < N; ++i) bank.set(i, pixels[i]);
     return bank;
+}
+
+template <size_t N>
+template <typename T>
+PixelBank<N>::Row<int32_t> PixelBank<N>::rowOf(std::span<const T, N> raw) {
+    static_assert(N >= Lanes::kWidth && kLanes == Lanes::kWidth);
+    Row<int32_t> row;
+    size_t b = 0;
+    for (; b + kLanes <= N; b += kLanes) Lanes::store(&row[b], Lanes::widen(&raw[b]));
+    if (b < N) {
+        // The last eight readings, moved down to their lanes, with zeros after them.
+        Lanes::store(&row[b], Lanes::shiftDown<kStored - N>(Lanes::widen(&raw[N - kLanes])));
+    }
+    return row;
 }
 
 template <size_t N>
@@ -109,7 +134,7 @@ void PixelBank<N>::set(size_t i, const Pixel& p) {
 }
 
 // The 15 real pixels A..O, and the 23 virtual pixels in group order. Their update is compiled
-// once, in the library, where the build lets the vectoriser turn the loop into vector code.
+// once, in the library, in each machine variant.
 using RealPixels = PixelBank<kPixelCount>;
 using VirtualPixels = PixelBank<kVirtualPixelCount>;
 

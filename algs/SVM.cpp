@@ -1,11 +1,12 @@
 #include "algs/SVM.h"
 
+#include "algs/Lanes.h"
 #include "algs/MachineVariants.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <cstdint>
-#include <functional>
 #include <stdexcept>
 
 namespace TolkaTouch {
@@ -37,58 +38,105 @@ constexpr std::array<Rank, SVM::kRankCount> kRanks{{
 
 constexpr size_t kRankCount = SVM::kRankCount;
 
-// The score's arithmetic in two machine variants: every step is a single correctly rounded IEEE
-// operation (subtract, divide, fused multiply-add), whichever instructions carry it out.
-// One fused multiply-add per rank, strongest first, onto the bias-free score.
-TOLKA_MACHINE_VARIANTS
-float scoreOfRanked(const int32_t* ranked, const float* means, const float* scales, const float* weights) {
-    std::array<float, kRankCount> standardized;
-    for (size_t i = 0; i < kRankCount; ++i) standardized[i] = (static_cast<float>(ranked[i]) - means[i]) / scales[i];
-    float score = 0.0f;
-    for (size_t i = 0; i < kRankCount; ++i) score = std::fma(standardized[i], weights[i], score);
-    return score;
-}
+}  // namespace
 
-// Largest first; equal values are interchangeable, so any correct sort gives the same list. In a
-// touch most elements read 0: the values above 0 go to the front and those below 0 to the back
-// without branches, the zeros fill the middle, and only the few on either side are sorted. No
-// allocation: std::sort works in place.
-void sortDescending(std::array<int32_t, kRankCount>& values, size_t count) {
-    std::array<int32_t, kRankCount> split{};
-    size_t positive = 0;
-    size_t negative = 0;
-    for (size_t i = 0; i < count; ++i) {
-        const int32_t v = values[i];
-        split[positive] = v;
-        positive += v > 0;
-    }
-    for (size_t i = 0; i < count; ++i) {
-        const int32_t v = values[i];
-        split[count - 1 - negative] = v;
-        negative += v < 0;
-    }
-    // The slots between hold 0 or a stale copy; they are all zeros.
-    std::fill(split.begin() + static_cast<std::ptrdiff_t>(positive),
-              split.begin() + static_cast<std::ptrdiff_t>(count - negative), 0);
-    std::copy_n(split.begin(), count, values.begin());
-    std::sort(values.begin(), values.begin() + static_cast<std::ptrdiff_t>(positive), std::greater<int32_t>());
-    std::sort(values.begin() + static_cast<std::ptrdiff_t>(count - negative),
-              values.begin() + static_cast<std::ptrdiff_t>(count), std::greater<int32_t>());
-}
+// The elements of one frame as five vectors of eight lanes: two from `first`, three from `rest`.
+// `valid` marks the lanes that hold an element, `count` of them; every other lane reads 0.
+struct SVM::ElementLanes {
+    static constexpr size_t kFirst = 16;
+    static constexpr size_t kLanes = 40;
+    const int32_t* first;
+    const int32_t* rest;
+    uint64_t valid = 0;
+    size_t count = 0;
+};
 
-// Whether a frame is scored: something converts above the gate, or two values are at noise or
-// above. Counted, not branched on, so that the loop becomes vector code.
-bool worthScoring(const int32_t* values, size_t count, float gate) {
-    int32_t aboveGate = 0;
-    int32_t aboveNoise = 0;
-    for (size_t i = 0; i < count; ++i) {
-        aboveGate |= static_cast<int32_t>(static_cast<float>(values[i]) > gate);
-        aboveNoise += static_cast<int32_t>(values[i] >= Pixel::kNoiseLevel + 1);
+namespace {
+
+uint64_t laneBits(const Lanes::Mask& m, size_t block) { return uint64_t{Lanes::bits(m)} << (block * Lanes::kWidth); }
+
+// Largest first, in place; few values, so an insertion sort.
+void sortDescending(int32_t* values, size_t count) {
+    for (size_t i = 1; i < count; ++i) {
+        const int32_t v = values[i];
+        size_t j = i;
+        for (; j > 0 && values[j - 1] < v; --j) values[j] = values[j - 1];
+        values[j] = v;
     }
-    return aboveGate != 0 || aboveNoise >= 2;
 }
 
 }  // namespace
+
+// In two machine variants: every step of the score is a single correctly rounded IEEE operation
+// (convert, subtract, divide, fused multiply-add), whichever instructions carry it out.
+TOLKA_MACHINE_VARIANTS
+void SVM::scoreLanes(const ElementLanes& elements, float gate) {
+    using Lanes::Floats;
+    using Lanes::Ints;
+    using Lanes::Mask;
+    constexpr size_t kBlocks = ElementLanes::kLanes / Lanes::kWidth;
+
+    // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
+    // sort: something converts above the gate, or two values are at noise or above.
+    const Floats gates = Lanes::broadcast(gate);
+    const Ints laneBit{1, 2, 4, 8, 16, 32, 64, 128};
+    alignas(32) std::array<int32_t, ElementLanes::kLanes> value;
+    std::array<Ints, kBlocks> blocks;
+    std::array<Mask, kBlocks> valid;
+    Mask aboveGate{};
+    Ints aboveNoise{};
+    for (size_t b = 0; b < kBlocks; ++b) {
+        const size_t at = b * Lanes::kWidth;
+        blocks[b] = Lanes::load<Ints>(at < ElementLanes::kFirst ? elements.first + at
+                                                                : elements.rest + (at - ElementLanes::kFirst));
+        Lanes::store(&value[at], blocks[b]);
+        valid[b] = (laneBit & static_cast<int32_t>((elements.valid >> at) & 0xff)) != 0;
+        aboveGate |= valid[b] & (Lanes::toFloats(blocks[b]) > gates);
+        aboveNoise -= valid[b] & (blocks[b] > Lanes::broadcast(Pixel::kNoiseLevel));  // a mask lane is -1
+    }
+    int32_t aboveNoiseCount = 0;
+    for (size_t j = 0; j < Lanes::kWidth; ++j) aboveNoiseCount += aboveNoise[j];
+    if (Lanes::bits(aboveGate) == 0 && aboveNoiseCount < 2) return;
+
+    // Which lanes are above 0 and which below: in a touch most elements read 0, and only the
+    // values either side of it need sorting.
+    uint64_t positive = 0;
+    uint64_t negative = 0;
+    for (size_t b = 0; b < kBlocks; ++b) {
+        positive |= laneBits(valid[b] & (blocks[b] > 0), b);
+        negative |= laneBits(valid[b] & (blocks[b] < 0), b);
+    }
+
+    // 3. Largest first: the values above 0, the zeros, the values below 0.
+    const size_t count = elements.count;
+    std::array<int32_t, ElementLanes::kLanes> above;
+    std::array<int32_t, ElementLanes::kLanes> below;
+    size_t aboveCount = 0;
+    size_t belowCount = 0;
+    for (uint64_t m = positive; m != 0; m &= m - 1) above[aboveCount++] = value[std::countr_zero(m)];
+    for (uint64_t m = negative; m != 0; m &= m - 1) below[belowCount++] = value[std::countr_zero(m)];
+    sortDescending(above.data(), aboveCount);
+    sortDescending(below.data(), belowCount);
+
+    // 5. Each rank standardised: a zero's rank all at once, then the ranks of the values either
+    // side of 0.
+    alignas(32) std::array<float, ElementLanes::kLanes> standardized;
+    size_t r = 0;
+    for (; r + Lanes::kWidth <= count; r += Lanes::kWidth) {
+        Lanes::store(&standardized[r], (Floats{} - Lanes::load<Floats>(&means[r])) / Lanes::load<Floats>(&scales[r]));
+    }
+    for (; r < count; ++r) standardized[r] = (0.0f - means[r]) / scales[r];
+    const auto standardize = [&](size_t rank, int32_t v) {
+        standardized[rank] = (static_cast<float>(v) - means[rank]) / scales[rank];
+    };
+    for (size_t i = 0; i < aboveCount; ++i) standardize(i, above[i]);
+    for (size_t i = 0; i < belowCount; ++i) standardize(count - belowCount + i, below[i]);
+
+    // One fused multiply-add per rank, strongest first, onto the bias-free score; 6. the bias.
+    float sum = 0.0f;
+    for (size_t i = 0; i < count; ++i) sum = std::fma(standardized[i], weights[i], sum);
+    score = sum + bias;
+}
 
 SVM::SVM() {
     for (size_t i = 0; i < kRankCount; ++i) {
@@ -107,43 +155,21 @@ void SVM::updateSVMScore(std::span<const Pixel> pixels, std::span<const VirtualP
     // the score, so the list holds just those.
     const size_t count = pixels.size() + virtualPixels.size();
     if (count < 2 || count > kRankCount) throw std::out_of_range("vector");
-    std::array<int32_t, kRankCount> values;
+    alignas(32) std::array<int32_t, ElementLanes::kLanes> values{};
     size_t n = 0;
     for (const Pixel& p : pixels) values[n++] = p.value;
     for (const VirtualPixel& p : virtualPixels) values[n++] = p.value;
-    scoreValues(values, count, gate);
+    scoreLanes({values.data(), values.data() + ElementLanes::kFirst, (uint64_t{1} << count) - 1, count}, gate);
 }
 
 void SVM::updateSVMScore(const RealPixels& pixels, const VirtualPixels& virtualPixels, float gate) {
-    static_assert(RealPixels::size() + VirtualPixels::size() == kRankCount);
+    // The two rows side by side, each with its padding lanes, which read 0 and are no element.
+    static_assert(RealPixels::kStored == ElementLanes::kFirst &&
+                  RealPixels::kStored + VirtualPixels::kStored == ElementLanes::kLanes);
     score = 0.0f;
-    std::array<int32_t, kRankCount> values;
-    std::copy_n(pixels.value.begin(), RealPixels::size(), values.begin());
-    std::copy_n(virtualPixels.value.begin(), VirtualPixels::size(), values.begin() + RealPixels::size());
-    scoreValues(values, kRankCount, gate);
-}
-
-void SVM::scoreValues(std::array<int32_t, kRankCount>& values, size_t count, float gate) {
-    // 4. Gate first, so a quiet frame is not scored (the bias is not added either) and skips the
-    // sort. Rank 0 above the gate means some value converts above it (the conversion keeps
-    // order); rank 1 at noise or above means two values are.
-    if (!worthScoring(values.data(), count, gate)) return;
-
-    if (count == kRankCount) {
-        // 3., 5. The surface's 38 elements.
-        // 3. Largest first.
-        sortDescending(values, kRankCount);
-        score = scoreOfRanked(values.data(), means.data(), scales.data(), weights.data());
-    } else {
-        // Fewer elements than ranks: the first `count` ranks, in the same order of operations.
-        sortDescending(values, count);
-        for (size_t i = 0; i < count; ++i) {
-            score = std::fma((static_cast<float>(values[i]) - means[i]) / scales[i], weights[i], score);
-        }
-    }
-
-    // 6.
-    score += bias;
+    constexpr uint64_t kReal = (uint64_t{1} << RealPixels::size()) - 1;
+    constexpr uint64_t kVirtual = ((uint64_t{1} << VirtualPixels::size()) - 1) << RealPixels::kStored;
+    scoreLanes({pixels.value.data(), virtualPixels.value.data(), kReal | kVirtual, kRankCount}, gate);
 }
 
 }  // namespace TolkaTouch

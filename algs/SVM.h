@@ -34,8 +34,9 @@ public:
     float bias = 2.0083f;
 
 private:
-    // The score of `count` (2..38) element values, which it reorders.
-    void scoreValues(std::array<int32_t, kRankCount>& values, size_t count, float gate);
+    struct ElementLanes;
+    // This frame's score from its element values.
+    void scoreLanes(const ElementLanes& elements, float gate);
 };
 
 }  // namespace TolkaTouch

@@ -1,5 +1,6 @@
 #include "algs/VirtualImage.h"
 
+#include "algs/MachineVariants.h"
 #include "tolkatouch/FrameSnapshot.h"
 
 #include <algorithm>
@@ -45,6 +46,19 @@ constexpr std::array<GroupMembers, kGroups.size()> membersOf() {
 
 constexpr auto kMembers = membersOf();
 
+// Slot k of every group as one row, eight groups to a vector; the row's padding group has no
+// members.
+constexpr size_t kGroupLanes = VirtualPixels::kStored;
+constexpr std::array<std::array<int32_t, kGroupLanes>, 4> memberLanesOf() {
+    std::array<std::array<int32_t, kGroupLanes>, 4> lanes{};
+    for (size_t k = 0; k < 4; ++k) {
+        for (size_t g = 0; g < kGroupLanes; ++g) lanes[k][g] = g < kGroups.size() ? kMembers[g].index[k] : kNoMember;
+    }
+    return lanes;
+}
+
+alignas(32) constexpr auto kMemberLanes = memberLanesOf();
+
 // Element i with a range test: an index outside the vector raises the standard out-of-range
 // failure with the message "vector".
 template <typename T>
@@ -83,40 +97,17 @@ void VirtualImage::updateValues(std::span<const Pixel> pixels) {
 }
 
 void VirtualImage::updateValues(std::span<const int32_t> pixels) {
-    // 1. Sums start afresh; the strongest members carry over from the last frame.
-    std::fill(values.begin(), values.end(), 0);
-
-    // The surface's own 15 pixels and the fixed groups: the members were looked up once, and the
-    // pixels' values are read into one row with a slot for "no member" first.
-    if (pixels.size() == kPixelCount && groups.size() == kGroups.size() && values.size() == kGroups.size() &&
-        strongest.size() == kGroups.size()) {
-        std::array<int32_t, kPixelCount + 1> pixelValue;
-        std::copy(pixels.begin(), pixels.end(), pixelValue.begin());
-        pixelValue[kNoMember] = 0;
-        for (size_t g = 0; g < kGroups.size(); ++g) {
-            const GroupMembers& members = kMembers[g];
-            uint32_t strongestIndex = static_cast<uint32_t>(strongest[g]);
-            if (strongestIndex >= kPixelCount) {
-                // Only a member above noise compares against the recorded strongest.
-                for (const uint8_t i : members.index) {
-                    if (pixelValue[i] >= Pixel::kNoiseLevel + 1) throw std::out_of_range("vector");
-                }
-                values[g] = 0;
-                continue;
-            }
-            // Every group has four slots: the same steps for each, choosing instead of branching.
-            int32_t sum = 0;
-            for (const uint8_t i : members.index) {
-                const int32_t v = pixelValue[i];
-                const bool aboveNoise = v >= Pixel::kNoiseLevel + 1;
-                sum += aboveNoise ? v : 0;
-                strongestIndex = aboveNoise && v > pixelValue[strongestIndex] ? i : strongestIndex;
-            }
-            values[g] = sum;
-            strongest[g] = static_cast<int32_t>(strongestIndex);
-        }
+    if (pixels.size() == kPixelCount) {
+        VirtualPixels::Row<int32_t> readings;
+        updateValues(RealPixels::rowOf(pixels.first<kPixelCount>()), readings);
         return;
     }
+    updateValuesOneByOne(pixels);
+}
+
+void VirtualImage::updateValuesOneByOne(std::span<const int32_t> pixels) {
+    // 1. Sums start afresh; the strongest members carry over from the last frame.
+    std::fill(values.begin(), values.end(), 0);
 
     // 2. Members above noise add their value; a member takes over as strongest only when strictly
     // stronger than this frame's value of the one recorded, so ties keep the old one and, among
@@ -134,6 +125,69 @@ void VirtualImage::updateValues(std::span<const int32_t> pixels) {
             }
         }
     }
+}
+
+TOLKA_MACHINE_VARIANTS
+void VirtualImage::updateValues(const RealPixels::Row<int32_t>& pixels, VirtualPixels::Row<int32_t>& readings) {
+    using Lanes::Ints;
+    using Lanes::Mask;
+    constexpr size_t kBlocks = VirtualPixels::kStored / Lanes::kWidth;
+    static_assert(RealPixels::kStored == 2 * Lanes::kWidth && VirtualPixels::size() == kGroups.size());
+
+    // The surface's own groups, each strongest member recorded a pixel of the surface: all 23
+    // groups at once, eight to a vector.
+    std::array<Ints, kBlocks> recorded{};
+    bool fast = groups.size() == kGroups.size() && values.size() == kGroups.size() && strongest.size() == kGroups.size();
+    if (fast) {
+        const auto row = VirtualPixels::rowOf(std::span<const int32_t, kVirtualPixelCount>(strongest.data(), kVirtualPixelCount));
+        Mask outside{};
+        for (size_t b = 0; b < kBlocks; ++b) {
+            recorded[b] = Lanes::load<Ints>(&row[b * Lanes::kWidth]);
+            outside |= (recorded[b] < 0) | (recorded[b] >= static_cast<int32_t>(kPixelCount));
+        }
+        fast = Lanes::bits(outside) == 0;
+    }
+    if (!fast) {
+        // Anything else takes the steps one member at a time, with their range tests.
+        updateValuesOneByOne(std::span(pixels).first<kPixelCount>());
+        readings.fill(0);
+        for (size_t g = 0; g < std::min(values.size(), kGroups.size()); ++g) readings[g] = static_cast<int16_t>(values[g]);
+        return;
+    }
+
+    // The pixel values as a table of 16: slot 15 is "no member", a padding lane that reads 0.
+    const Ints low = Lanes::load<Ints>(&pixels[0]);
+    const Ints high = Lanes::load<Ints>(&pixels[Lanes::kWidth]);
+    const auto valueAt = [&](Ints index) { return __builtin_shuffle(low, high, index); };
+    const Ints noise = Lanes::broadcast(Pixel::kNoiseLevel);
+
+    std::array<Ints, kBlocks> sum{};
+    for (size_t b = 0; b < kBlocks; ++b) {
+        Ints strongestIndex = recorded[b];
+        Ints strongestValue = valueAt(strongestIndex);
+        // Each group's four slots in letter order, the same steps for each.
+        for (size_t slot = 0; slot < 4; ++slot) {
+            const Ints member = Lanes::load<Ints>(&kMemberLanes[slot][b * Lanes::kWidth]);
+            const Ints v = valueAt(member);
+            const Mask aboveNoise = v > noise;
+            const Mask takesOver = aboveNoise & (v > strongestValue);
+            sum[b] += v & aboveNoise;
+            strongestIndex = Lanes::select(takesOver, member, strongestIndex);
+            strongestValue = Lanes::select(takesOver, v, strongestValue);
+        }
+        recorded[b] = strongestIndex;
+        Lanes::store(&readings[b * Lanes::kWidth], (sum[b] << 16) >> 16);
+    }
+
+    // Back into the lists of 23: the last block's seven groups go in with the one before them.
+    static_assert(kBlocks == 3 && kVirtualPixelCount == 23);
+    constexpr Ints kLastSeven{7, 8, 9, 10, 11, 12, 13, 14};
+    Lanes::store(&values[0], sum[0]);
+    Lanes::store(&values[8], sum[1]);
+    Lanes::store(&values[15], __builtin_shuffle(sum[1], sum[2], kLastSeven));
+    Lanes::store(&strongest[0], recorded[0]);
+    Lanes::store(&strongest[8], recorded[1]);
+    Lanes::store(&strongest[15], __builtin_shuffle(recorded[1], recorded[2], kLastSeven));
 }
 
 }  // namespace TolkaTouch

@@ -5,6 +5,9 @@
 #include <array>
 
 #include <limits>
+#include <random>
+#include <span>
+#include <vector>
 #include <stdexcept>
 
 #include <cmath>
@@ -468,6 +471,25 @@ TEST(HandStatsTest, AKeyThatIsNotANumberComesLast) {
     frame.pixels[0].maxNormalizedAboveNoise = std::numeric_limits<float>::quiet_NaN();
     frame.pixels[1].maxNormalizedAboveNoise = std::numeric_limits<float>::quiet_NaN();
     EXPECT_EQ(twoFirstIndices(frame.pixels), std::make_pair(2, 3));
+}
+
+TEST(HandStatsTest, TheRowFindsTheSameTwoFirstPixelsAsTheListOnTiesNotANumberSignedZeroAndRepeatedIndices) {
+    const float keys[] = {0.0f, -0.0f, 2.0f, 2.0f, std::numeric_limits<float>::quiet_NaN(), -1.0f, 3.5f,
+                          -std::numeric_limits<float>::infinity(), 0.5f};
+    std::mt19937 random(7);
+    for (int round = 0; round < 2000; ++round) {
+        std::vector<Pixel> pixels;
+        for (int i = 0; i < 15; ++i) {
+            // Mostly each pixel its own index; now and then a list in another order or with repeats.
+            const int index = round % 3 == 0 ? static_cast<int>(random() % 15) : round % 3 == 1 ? 14 - i : i;
+            pixels.emplace_back(index, 1.0f);
+            pixels.back().maxNormalizedAboveNoise = keys[random() % std::size(keys)];
+        }
+        const auto [first, second] = twoFirstByMaxNormalizedAboveNoise(pixels);
+        const auto [firstAt, secondAt] = twoFirstByMaxNormalizedAboveNoise(RealPixels::of(std::span<const Pixel>(pixels)));
+        ASSERT_EQ(firstAt, static_cast<size_t>(first - pixels.data())) << "round " << round;
+        ASSERT_EQ(secondAt, static_cast<size_t>(second - pixels.data())) << "round " << round;
+    }
 }
 
 TEST(HandStatsTest, FewerThanTwoPixelsFailWithTheMessageVector) {

@@ -2,7 +2,10 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <random>
 #include <stdexcept>
+#include <vector>
 #include <string>
 
 namespace TolkaTouch {
@@ -105,6 +108,52 @@ TEST(VirtualImageTest, StrongestComparesAgainstThisFramesValueOfTheRecordedPixel
     setValues(pixels, {{'C', 100}, {'D', 200}});
     image.updateValues(pixels);
     EXPECT_EQ(image.strongest[6], 3);
+}
+
+// The group rule step by step, as a plain loop over the letters.
+void updateByTheLetters(std::vector<int32_t>& values, std::vector<int32_t>& strongest,
+                        const std::vector<std::string>& groups, const std::vector<int32_t>& pixels) {
+    std::fill(values.begin(), values.end(), 0);
+    for (size_t g = 0; g < groups.size(); ++g) {
+        for (const char letter : groups[g]) {
+            const size_t i = static_cast<size_t>(letter - 'A');
+            if (pixels[i] >= 76) {
+                values[g] += pixels[i];
+                if (pixels[i] > pixels[static_cast<size_t>(strongest[g])]) strongest[g] = static_cast<int32_t>(i);
+            }
+        }
+    }
+}
+
+TEST(VirtualImageTest, AllGroupsAtOnceGiveTheSumsStrongestMembersAndNarrowedReadingsOfTheLetterByLetterRule) {
+    const int32_t readings[] = {0, 75, 76, 77, 300, 300, 32767, 40000, -5, 1000, 76, 200, 200, 90};
+    std::mt19937 random(11);
+    VirtualImage image;
+    std::vector<int32_t> values(23, 0);
+    std::vector<int32_t> strongest = image.strongest;
+    for (int frame = 0; frame < 3000; ++frame) {
+        RealPixels::Row<int32_t> row{};
+        std::vector<int32_t> pixels(15);
+        for (size_t i = 0; i < 15; ++i) row[i] = pixels[i] = readings[random() % std::size(readings)];
+        VirtualPixels::Row<int32_t> narrowed;
+        image.updateValues(row, narrowed);
+        updateByTheLetters(values, strongest, image.groups, pixels);
+        ASSERT_EQ(image.values, values) << "frame " << frame;
+        ASSERT_EQ(image.strongest, strongest) << "frame " << frame;
+        for (size_t g = 0; g < 23; ++g) ASSERT_EQ(narrowed[g], static_cast<int16_t>(values[g])) << "frame " << frame;
+        ASSERT_EQ(narrowed[23], 0);
+    }
+}
+
+TEST(VirtualImageTest, AGroupSumAbove32767ReachesItsVirtualPixelWrappedToSixteenBits) {
+    VirtualImage image;
+    RealPixels::Row<int32_t> row{};
+    row[6] = 20000;  // G
+    row[7] = 20000;  // H
+    VirtualPixels::Row<int32_t> narrowed;
+    image.updateValues(row, narrowed);
+    EXPECT_EQ(image.values[15], 40000);           // GHI
+    EXPECT_EQ(narrowed[15], 40000 - 65536);       // read as a signed 16-bit number
 }
 
 TEST(VirtualImageTest, TooFewPixelsRaiseTheStandardOutOfRangeFailure) {
