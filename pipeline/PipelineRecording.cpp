@@ -143,7 +143,7 @@ void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputRe
 // bound are dropped without clearing the set, so everything older than the oldest kept report is
 // one stretch: one State frame per key, the newest, which restores the settings in force.
 void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputReports,
-                                   std::list<Frame>::iterator* cursor, std::list<Frame>* dropped, size_t keep) {
+                                   std::list<Frame>::iterator* cursor, std::list<Frame>* dropped, size_t spareAtMost) {
     if (frames.empty()) return;
     std::unordered_set<std::string> keys;
     uint64_t keptReports = 0;
@@ -170,7 +170,7 @@ void PipelineRecording::trimFrames(std::list<Frame>& frames, uint64_t maxInputRe
         // Everything after this frame is decided already, so its successor is the next frame
         // that survives: a playback cursor on the removed frame moves there.
         const bool cursorHere = cursor != nullptr && *cursor == it;
-        if (dropped != nullptr && dropped->size() < keep) {
+        if (dropped != nullptr && dropped->size() < spareAtMost) {
             const auto next = std::next(it);
             dropped->splice(dropped->end(), frames, it);
             it = next;

@@ -122,9 +122,9 @@ private:
 
     void recordState(uint64_t timestamp, const std::string& key, const PropertyValue& value) noexcept;
     void recordInputReport(uint64_t timestamp, const uint8_t* bytes, size_t length) noexcept;
-    // Frames dropped go to the end of `dropped` while it holds fewer than `keep`, else are freed.
+    // Frames dropped go to the end of `dropped` while it holds fewer than `spareAtMost`, else are freed.
     static void trimFrames(std::list<Frame>& frames, uint64_t maxInputReports, std::list<Frame>::iterator* cursor,
-                           std::list<Frame>* dropped = nullptr, size_t keep = 0);
+                           std::list<Frame>* dropped = nullptr, size_t spareAtMost = 0);
     void trim(uint64_t maxInputReports);
     void appended() noexcept;
     void adoptCursor(const PlayCursor& cursor, const std::list<Frame>& from);

@@ -171,6 +171,23 @@ TEST(PipelineRecordingTest, ReportsRecordedAfterTrimsInTheRoomOfDroppedFramesHav
     EXPECT_EQ(recording.frames().back().timestamp, Util::nanosecondsFromMachTime(clock.ticks - 3));
 }
 
+TEST(PipelineRecordingTest, AReportAfterATrimIsKeptInTheStorageOfAFrameTheTrimDropped) {
+    PipelineRecording recording;
+    recording.setMaxFrameCount(2);
+    const uint8_t report[] = {0x01, 0x02, 0x03};
+    std::vector<const uint8_t*> storage;
+    for (int i = 0; i < 3; ++i) {
+        recording.handleInputReport(report, sizeof report);
+        storage.push_back(recording.frames().back().report.data());
+    }
+    recording.handleInputReport(report, sizeof report);  // four frames: trimmed to the newest two
+    ASSERT_EQ(recording.frames().size(), 2u);
+    recording.handleInputReport(report, sizeof report);
+    const uint8_t* reused = recording.frames().back().report.data();
+    EXPECT_TRUE(reused == storage[0] || reused == storage[1]);
+    EXPECT_EQ(recording.frames().back().report, (std::vector<uint8_t>{0x01, 0x02, 0x03}));
+}
+
 TEST_F(PipelineRecordingWithPipelineTest, TrimmingKeepsTheNewestReports) {
     recording.setMaxFrameCount(2);
     for (uint8_t tag = 1; tag <= 4; ++tag) recording.appendFrame(R(tag));
