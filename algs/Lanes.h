@@ -29,9 +29,23 @@ inline void store(void* to, V v) {
     std::memcpy(to, &v, sizeof v);
 }
 
+// Lane i of the result is lane index[i] of the sixteen lanes of low then high (index 0 to 15).
+template <typename V>
+inline V lookUp(V low, V high, Ints index) {
+#if defined(__clang__)
+    // This compiler has no shuffle by lanes known only when the program runs; a look-up lane by
+    // lane (only the fuzzing build takes it).
+    V out;
+    for (size_t j = 0; j < kWidth; ++j) out[j] = (index[j] & 8) != 0 ? high[index[j] & 7] : low[index[j] & 7];
+    return out;
+#else
+    return __builtin_shuffle(low, high, index);
+#endif
+}
+
 // Lane 0 copied into every lane (adding x to zeros would turn -0.0 into 0.0).
-inline Floats broadcast(float x) { return __builtin_shuffle(Floats{x}, Ints{}); }
-inline Ints broadcast(int32_t x) { return __builtin_shuffle(Ints{x}, Ints{}); }
+inline Floats broadcast(float x) { return lookUp(Floats{x}, Floats{}, Ints{}); }
+inline Ints broadcast(int32_t x) { return lookUp(Ints{x}, Ints{}, Ints{}); }
 
 inline Floats toFloats(Ints v) { return __builtin_convertvector(v, Floats); }
 // Truncation toward zero of lanes that are inside the 32-bit range.
@@ -49,7 +63,7 @@ template <int Shift>
 inline Ints shiftDown(Ints v) {
     static_assert(Shift >= 0 && Shift <= static_cast<int>(kWidth));
     constexpr Ints kFrom{Shift, Shift + 1, Shift + 2, Shift + 3, Shift + 4, Shift + 5, Shift + 6, Shift + 7};
-    return __builtin_shuffle(v, Ints{}, kFrom);
+    return lookUp(v, Ints{}, kFrom);
 }
 
 // The mask as eight bits, lane i at bit i.
@@ -83,18 +97,18 @@ inline Floats minOf(Floats a, Floats b) { return select(b < a, b, a); }
 
 // The largest lane, for lanes that hold no not-a-number, in three steps of halving.
 inline float largest(Floats v) {
-    v = maxOf(v, __builtin_shuffle(v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
-    v = maxOf(v, __builtin_shuffle(v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
-    v = maxOf(v, __builtin_shuffle(v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
+    v = maxOf(v, lookUp(v, v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
+    v = maxOf(v, lookUp(v, v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
+    v = maxOf(v, lookUp(v, v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
     return v[0];
 }
 
 // The smallest lane.
 inline int32_t smallest(Ints v) {
     const auto lesser = [](Ints a, Ints b) { return select(b < a, b, a); };
-    v = lesser(v, __builtin_shuffle(v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
-    v = lesser(v, __builtin_shuffle(v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
-    v = lesser(v, __builtin_shuffle(v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
+    v = lesser(v, lookUp(v, v, Ints{4, 5, 6, 7, 0, 1, 2, 3}));
+    v = lesser(v, lookUp(v, v, Ints{2, 3, 0, 1, 6, 7, 4, 5}));
+    v = lesser(v, lookUp(v, v, Ints{1, 0, 3, 2, 5, 4, 7, 6}));
     return v[0];
 }
 

@@ -84,7 +84,7 @@ PixelBank<N> PixelBank<N>::of(std::span<const P> pixels) {
 
 template <size_t N>
 template <typename T>
-PixelBank<N>::Row<int32_t> PixelBank<N>::rowOf(std::span<const T, N> raw) {
+typename PixelBank<N>::template Row<int32_t> PixelBank<N>::rowOf(std::span<const T, N> raw) {
     static_assert(N >= Lanes::kWidth && kLanes == Lanes::kWidth);
     Row<int32_t> row;
     size_t b = 0;

@@ -158,7 +158,7 @@ void VirtualImage::updateValues(const RealPixels::Row<int32_t>& pixels, VirtualP
     // The pixel values as a table of 16: slot 15 is "no member", a padding lane that reads 0.
     const Ints low = Lanes::load<Ints>(&pixels[0]);
     const Ints high = Lanes::load<Ints>(&pixels[Lanes::kWidth]);
-    const auto valueAt = [&](Ints index) { return __builtin_shuffle(low, high, index); };
+    const auto valueAt = [&](Ints index) { return Lanes::lookUp(low, high, index); };
     const Ints noise = Lanes::broadcast(Pixel::kNoiseLevel);
 
     std::array<Ints, kBlocks> sum{};
@@ -184,10 +184,10 @@ void VirtualImage::updateValues(const RealPixels::Row<int32_t>& pixels, VirtualP
     constexpr Ints kLastSeven{7, 8, 9, 10, 11, 12, 13, 14};
     Lanes::store(&values[0], sum[0]);
     Lanes::store(&values[8], sum[1]);
-    Lanes::store(&values[15], __builtin_shuffle(sum[1], sum[2], kLastSeven));
+    Lanes::store(&values[15], Lanes::lookUp(sum[1], sum[2], kLastSeven));
     Lanes::store(&strongest[0], recorded[0]);
     Lanes::store(&strongest[8], recorded[1]);
-    Lanes::store(&strongest[15], __builtin_shuffle(recorded[1], recorded[2], kLastSeven));
+    Lanes::store(&strongest[15], Lanes::lookUp(recorded[1], recorded[2], kLastSeven));
 }
 
 }  // namespace TolkaTouch
