@@ -212,18 +212,18 @@ TEST_F(LogTest, EachSummaryEndsWithTheTextAndContextOfTheLastLineFoldedSinceTheO
     SystemLog::setSink(sink, true);
     const Log log(kSubsystem, "GuardedTwice");
     SystemLog::setThreadContext(LogContext{"simulated:/a/longer/document/name.json", 1u, 0u});
-    for (unsigned frame = 1; frame <= 15; ++frame) log.log("Received image frame: %u", frame);
+    for (unsigned frame = 1; frame <= 15; ++frame) log.log("Twice folded frame: %u", frame);
     SystemLog::flushFolded(true);
     SystemLog::setThreadContext(LogContext{"/dev/hidraw0", 2u, 18u});
-    for (unsigned frame = 16; frame <= 18; ++frame) log.log("Received image frame: %u", frame);
+    for (unsigned frame = 16; frame <= 18; ++frame) log.log("Twice folded frame: %u", frame);
     SystemLog::flushFolded(true);
     SystemLog::flushFolded(true);  // nothing folded since: no third summary
     SystemLog::clearThreadContext();
     const std::vector<LogRecord> records = sink->records();
     ASSERT_EQ(records.size(), 12u);
-    EXPECT_EQ(records[10].message.substr(0, 46), "Received image frame: 15 (5 lines like this in");
+    EXPECT_EQ(records[10].message.substr(0, 44), "Twice folded frame: 15 (5 lines like this in");
     EXPECT_EQ(records[10].context.device, "simulated:/a/longer/document/name.json");
-    EXPECT_EQ(records[11].message.substr(0, 46), "Received image frame: 18 (3 lines like this in");
+    EXPECT_EQ(records[11].message.substr(0, 44), "Twice folded frame: 18 (3 lines like this in");
     EXPECT_EQ(records[11].context.device, "/dev/hidraw0");
     EXPECT_EQ(records[11].context.service, 2u);
     EXPECT_EQ(records[11].context.frame, 18u);
