@@ -339,14 +339,6 @@ void Log::emitFormatted(LogLevel level, const LogFormat* format, ...) const {
     va_end(args);
 }
 
-std::string LogArguments::formatUnchecked(const char* format, ...) {
-    va_list args;
-    va_start(args, format);
-    std::string text = formatStringV(format, args);
-    va_end(args);
-    return text;
-}
-
 void Log::emitKept(LogLevel level, const LogFormat& format, const LogArguments& arguments) const {
     emit(level, format, nullptr, &arguments);
 }
