@@ -60,7 +60,7 @@ std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::spa
     return {&pixels[first], &pixels[second]};
 }
 
-// Over whole vectors, in two machine variants: the first is the earliest of the elements with the
+// Over whole vectors, in each machine variant: the first is the earliest of the elements with the
 // largest key and, among those, the smallest index; the second the same among the others. That is
 // what the one pass over the list finds, as equal elements never displace an earlier one.
 TOLKA_MACHINE_VARIANTS
@@ -145,7 +145,7 @@ void HandStats::updateTapRejection(std::span<const Pixel> pixels, std::span<cons
 struct HandStats::RowScan {
     int32_t strongestIndex = 0;  // this frame's strongest element, 0 when none is above 0
     bool newStrongestOn = false;  // an on element is stronger than the record given
-    int32_t strongestOnIndex = 0; // ... the first such, and its strength
+    int32_t strongestOnIndex = 0;  // ... the first such, and its strength
     float strongestOnStrength = 0.0f;
     bool someOn = false;
     bool someAboveNoise = false;
@@ -156,7 +156,7 @@ struct HandStats::RowScan {
 // s (when above 0), and the strongest on element the first on one whose s is the largest on s.
 // That is what a scan keeping each strictly stronger element finds; not-a-number strengths never
 // win either way. Padding lanes are never on and their s is never above 0. Eight lanes at a time,
-// in two machine variants.
+// in each machine variant.
 TOLKA_MACHINE_VARIANTS
 HandStats::RowScan HandStats::scanRows(const RealPixels& pixels, const VirtualPixels& virtualPixels,
                                        float onRecord) {

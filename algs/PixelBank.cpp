@@ -35,7 +35,7 @@ template <size_t N>
     }
 }
 
-// In two machine variants: the wide one does eight lanes per instruction. The readings' row is
+// In each machine variant: the wider ones do eight lanes per instruction. The readings' row is
 // built in the same variant as the update that reads it, so that it is written and read a whole
 // vector at a time.
 template <size_t N>

@@ -67,7 +67,7 @@ void sortDescending(int32_t* values, size_t count) {
 
 }  // namespace
 
-// In two machine variants: every step of the score is a single correctly rounded IEEE operation
+// In each machine variant: every step of the score is a single correctly rounded IEEE operation
 // (convert, subtract, divide, fused multiply-add), whichever instructions carry it out.
 TOLKA_MACHINE_VARIANTS
 void SVM::scoreLanes(const ElementLanes& elements, float gate) {
