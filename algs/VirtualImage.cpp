@@ -137,9 +137,11 @@ void VirtualImage::updateValues(const RealPixels::Row<int32_t>& pixels, VirtualP
     // The surface's own groups, each strongest member recorded a pixel of the surface: all 23
     // groups at once, eight to a vector.
     std::array<Ints, kBlocks> recorded{};
-    bool fast = groups.size() == kGroups.size() && values.size() == kGroups.size() && strongest.size() == kGroups.size();
+    bool fast =
+        groups.size() == kGroups.size() && values.size() == kGroups.size() && strongest.size() == kGroups.size();
     if (fast) {
-        const auto row = VirtualPixels::rowOf(std::span<const int32_t, kVirtualPixelCount>(strongest.data(), kVirtualPixelCount));
+        const auto row =
+            VirtualPixels::rowOf(std::span<const int32_t, kVirtualPixelCount>(strongest.data(), kVirtualPixelCount));
         Mask outside{};
         for (size_t b = 0; b < kBlocks; ++b) {
             recorded[b] = Lanes::load<Ints>(&row[b * Lanes::kWidth]);
@@ -151,7 +153,9 @@ void VirtualImage::updateValues(const RealPixels::Row<int32_t>& pixels, VirtualP
         // Anything else takes the steps one member at a time, with their range tests.
         updateValuesOneByOne(std::span(pixels).first<kPixelCount>());
         readings.fill(0);
-        for (size_t g = 0; g < std::min(values.size(), kGroups.size()); ++g) readings[g] = static_cast<int16_t>(values[g]);
+        for (size_t g = 0; g < std::min(values.size(), kGroups.size()); ++g) {
+            readings[g] = static_cast<int16_t>(values[g]);
+        }
         return;
     }
 
