@@ -1,10 +1,12 @@
 #pragma once
-// Lanes: eight floats or eight 32-bit integers worked on as one value, the unit of the pixel rows'
-// frame updates, with loads, stores and the selects that mirror std::max/std::min bit for bit.
+// Lanes: eight floats or eight 32-bit integers worked on as one value, the unit of the
+// recognizer's per-frame steps, with loads, stores, look-ups across lanes and the selects that
+// mirror std::max/std::min bit for bit.
 // Written in the compiler's vector types, so that each machine variant of a function turns one
 // operation into one instruction of its width (two of the narrower ones on a baseline processor);
 // every operation still rounds as the scalar one does.
 
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
 
