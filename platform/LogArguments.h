@@ -9,6 +9,8 @@
 #include <type_traits>
 #include <utility>
 
+#include "platform/Format.h"
+
 namespace TolkaTouch {
 
 // Holds up to kMaxArguments arithmetic values, each as it was passed; text() formats them exactly
@@ -43,13 +45,12 @@ private:
     }
     template <typename... Args, size_t... Index>
     static std::string textOf(const char* format, const unsigned char* slots, std::index_sequence<Index...>) {
-        return formatUnchecked(format, load<Args>(slots + kSlotSize * Index)...);
+        return formatString(format, load<Args>(slots + kSlotSize * Index)...);
     }
     template <typename... Args>
     static std::string textOf(const char* format, const unsigned char* slots) {
         return textOf<Args...>(format, slots, std::index_sequence_for<Args...>{});
     }
-    static std::string formatUnchecked(const char* format, ...);
 
     std::string (*_text)(const char*, const unsigned char*) = nullptr;
     unsigned char _slots[kMaxArguments * kSlotSize] = {};
