@@ -31,33 +31,27 @@ bool precedes(float keyA, int32_t indexA, float keyB, int32_t indexB) {
     return indexA < indexB;
 }
 
-// The positions of the first two of `count` (at least 2) elements in the order `before`, in one
-// pass.
-template <typename Before>
-std::pair<size_t, size_t> twoFirstPositions(size_t count, Before before) {
-    size_t first = 0;
-    size_t second = 1;
-    if (before(second, first)) std::swap(first, second);
-    for (size_t i = 2; i < count; ++i) {
-        if (before(i, first)) {
+}  // namespace
+
+// The first two in one pass; an element equal to one already found never displaces it.
+std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels) {
+    if (pixels.size() < 2) throw std::out_of_range("vector");
+    const auto before = [](const Pixel& a, const Pixel& b) {
+        return precedes(a.maxNormalizedAboveNoise, a.index, b.maxNormalizedAboveNoise, b.index);
+    };
+    const Pixel* first = &pixels[0];
+    const Pixel* second = &pixels[1];
+    if (before(*second, *first)) std::swap(first, second);
+    for (size_t i = 2; i < pixels.size(); ++i) {
+        const Pixel* p = &pixels[i];
+        if (before(*p, *first)) {
             second = first;
-            first = i;
-        } else if (before(i, second)) {
-            second = i;
+            first = p;
+        } else if (before(*p, *second)) {
+            second = p;
         }
     }
     return {first, second};
-}
-
-}  // namespace
-
-std::pair<const Pixel*, const Pixel*> twoFirstByMaxNormalizedAboveNoise(std::span<const Pixel> pixels) {
-    if (pixels.size() < 2) throw std::out_of_range("vector");
-    const auto [first, second] = twoFirstPositions(pixels.size(), [&](size_t a, size_t b) {
-        return precedes(pixels[a].maxNormalizedAboveNoise, pixels[a].index, pixels[b].maxNormalizedAboveNoise,
-                        pixels[b].index);
-    });
-    return {&pixels[first], &pixels[second]};
 }
 
 // Over whole vectors, in each machine variant: the first is the earliest of the elements with the
@@ -471,13 +465,8 @@ PixelRegion HandStats::changeActiveRegion(const RealPixels& pixels, int index) {
 }
 
 void HandStats::updateTapRejection(const RealPixels& pixels, const VirtualPixels& virtualPixels) {
-    // 4. Elements above noise that were never on during the touch.
-    int32_t nonActive = 0;
-    for (size_t i = 0; i < pixels.size(); ++i) nonActive += pixels.wasAboveNoise[i] & (pixels.wasOn[i] ^ 1);
-    for (size_t i = 0; i < virtualPixels.size(); ++i) {
-        nonActive += virtualPixels.wasAboveNoise[i] & (virtualPixels.wasOn[i] ^ 1);
-    }
-    updateTapRejection(nonActive);
+    // 4. Elements above noise that were never on during the touch, counted as a frame counts them.
+    updateTapRejection(scanRows(pixels, virtualPixels, maxOnStrength).nonActive);
 }
 
 void HandStats::updateTapRejection(int32_t nonActive) {
