@@ -51,6 +51,9 @@ namespace PixelDetail {
 // its meaning for a single element.
 inline float toFloat(int32_t x) { return static_cast<float>(x); }
 inline Lanes::Floats toFloat(Lanes::Ints x) { return Lanes::toFloats(x); }
+// Truncation toward zero of a value inside the 32-bit range.
+inline int32_t toInt(float x) { return static_cast<int32_t>(x); }
+inline Lanes::Ints toInt(Lanes::Floats x) { return Lanes::toInts(x); }
 inline float select(bool m, float a, float b) { return m ? a : b; }
 inline int32_t select(bool m, int32_t a, int32_t b) { return m ? a : b; }
 using Lanes::select;
@@ -79,23 +82,16 @@ inline T splat(S s) {
 
 // Truncation toward zero. The product of a fixed gain and a 16-bit reading always fits; anything
 // else (a gain that is not a number, or huge) saturates instead of overflowing, and not-a-number
-// gives 0. Written with selects, not branches: the conversion only ever sees a number inside the
-// 32-bit range. Eight lanes are first held inside [-2^31, 2^31): the bottom converts to INT32_MIN
-// itself, the top is replaced after.
+// gives 0. Written with selects, not branches: the value is first held inside [-2^31, 2^31), so
+// the conversion only ever sees a number in the 32-bit range (the bottom converts to INT32_MIN
+// itself); the top is replaced after.
 template <typename F, typename I>
 inline I truncateToInt32(F x) {
     const F upper = splat<F>(2147483648.0f);
     const F lower = splat<F>(-2147483648.0f);
-    const auto high = x >= upper;
-    if constexpr (std::is_arithmetic_v<F>) {
-        const bool inRange = (x > lower) & (x < upper);  // false for not-a-number
-        const I truncated = static_cast<I>(inRange ? x : 0.0f);
-        return high ? INT32_MAX : x <= lower ? INT32_MIN : truncated;
-    } else {
-        const F belowUpper = splat<F>(2147483520.0f);  // the largest float below 2^31
-        const F held = select(x != x, F{}, minOf(maxOf(x, lower), belowUpper));
-        return select(high, splat<I>(INT32_MAX), Lanes::toInts(held));
-    }
+    const F belowUpper = splat<F>(2147483520.0f);  // the largest float below 2^31
+    const F held = select(x != x, F{}, minOf(maxOf(x, lower), belowUpper));
+    return select(x >= upper, splat<I>(INT32_MAX), toInt(held));
 }
 
 // One element's frame (the steps of Pixel::updatePixelState), on its fields wherever they live:
