@@ -325,17 +325,10 @@ void Log::write(LogLevel level, std::string message, const char* file, unsigned 
 void Log::emitFormatted(LogLevel level, const LogFormat* format, ...) const {
     va_list args;
     va_start(args, format);
-    va_list copy;
-    va_copy(copy, args);
-    // Most lines fit on the stack; a longer one is formatted again into a string of its length.
-    char small[256];
-    const int needed = std::vsnprintf(small, sizeof small, format->text, copy);
-    va_end(copy);
-    if (needed >= 0 && static_cast<size_t>(needed) < sizeof small) {
-        emit(level, *format, std::string_view(small, static_cast<size_t>(needed)));
-    } else {
-        emit(level, *format, formatStringV(format->text, args));
-    }
+    // Most lines fit on the stack and are not copied into a string of their own.
+    char small[kFormatOnStack];
+    std::string spill;
+    emit(level, *format, formatInto(small, spill, format->text, args));
     va_end(args);
 }
 
@@ -351,33 +344,32 @@ void Log::emit(LogLevel level, const LogFormat& format, std::string_view message
 void Log::emit(LogLevel level, const LogFormat& format, const std::string_view* message,
                const LogArguments* arguments) const {
     const char* file = sourceRelative(format.file);
-    auto text = [&] { return message ? std::string(*message) : arguments->text(format.text); };
-    auto makeRecord = [&] {
-        LogRecord record{_subsystem, _category, level, text()};
+    // Every field but the text, assigned so that a kept record's strings reuse their storage.
+    auto fill = [&](LogRecord& record) {
+        record.subsystem = _subsystem;
+        record.category = _category;
+        record.level = level;
         record.format = format.text;
         record.file = file;
         record.line = format.line;
         record.function = format.function;
         record.context = threadContext;
+        record.folded = 0;
+    };
+    auto makeRecord = [&] {
+        LogRecord record;
+        fill(record);
+        record.message = message ? std::string(*message) : arguments->text(format.text);
         return record;
     };
     auto keepFolded = [&](auto& folded) {
-        LogRecord& kept = folded.record;
-        kept.subsystem = _subsystem;
-        kept.category = _category;
-        kept.level = level;
+        fill(folded.record);
         if (message) {
-            kept.message.assign(*message);
+            folded.record.message.assign(*message);
             folded.arguments.reset();
         } else {
             folded.arguments = *arguments;
         }
-        kept.format = format.text;
-        kept.file = file;
-        kept.line = format.line;
-        kept.function = format.function;
-        kept.context = threadContext;
-        kept.folded = 0;
     };
     SinkState::shared().deliver(format.text, _category, level, makeRecord, keepFolded);
 }
